@@ -1,0 +1,92 @@
+// CHFMigrator: the migration engine. It holds everything one run works on:
+// the legacy folder list, one outcome per folder, and the settings maps that
+// are the interface between reading, conversion and registration. Its
+// operations are spread over the subsystems that own them (legacy/,
+// convert/); they reach the members directly.
+#ifndef HF_APP_MIGRATOR_H_
+#define HF_APP_MIGRATOR_H_
+
+#include <wx/arrstr.h>
+#include <wx/string.h>
+
+#include <map>
+#include <optional>
+#include <utility>
+
+#include "app/settings_map.h"
+#include "store/records.h"
+
+class CHFMigrator {
+ public:
+  CHFMigrator() = default;
+
+  // The whole migration: ReadLegacyList, then MigrateFolders. Answers what
+  // ReadLegacyList answered.
+  bool Run();
+
+  // legacy/list_file.cpp
+  bool ReadLegacyList();
+  // legacy/folder_reader.cpp
+  void MigrateFolders();
+  // convert/filter_settings.cpp
+  bool ConvertFilterSettings();
+  void ApplyPdfConversion();
+  // convert/registration.cpp
+  bool RegisterHotFolder();
+  // convert/impose.cpp
+  void ConvertImposeSettings(db::ImposeConfiguration& impose);
+  // convert/templates.cpp
+  wxString MapLegacyTemplate(const wxString& identifier);
+  wxString MakeCustomTemplatePath();
+
+  // Empties every settings map. Called before each folder is read, so that
+  // nothing of one folder reaches the next.
+  void ClearSettingsMaps();
+
+  wxArrayString m_Folders;       // legacy folder paths, in list-file order
+  wxArrayString m_Status;        // one outcome text per folder
+  wxArrayString m_EnabledFlags;  // "1" or "0", parallel to m_Folders
+  bool m_CurrentEnabled = true;  // the folder now being converted
+
+  // The 31 settings maps. "Conv" maps hold a legacy filter's converted
+  // settings.
+  SettingsMap m_FolderSettings;
+  SettingsMap m_FilterSettings;  // FILTERSETTINGS
+  SettingsMap m_FilterEnable;
+  SettingsMap m_OneBitTiff;
+  SettingsMap m_OneBitTiffConv;
+  SettingsMap m_CtlwFilter;
+  SettingsMap m_CtlwFilterConv;
+  SettingsMap m_Dcs2Filter;
+  SettingsMap m_Dcs2FilterConv;
+  SettingsMap m_Eps2PsFilter;
+  SettingsMap m_Eps2PsFilterConv;
+  SettingsMap m_ExportPs;
+  SettingsMap m_ExportPsConv;
+  SettingsMap m_Jpeg2Pdf;
+  SettingsMap m_Jpeg2PdfConv;
+  SettingsMap m_Pdf2Go;
+  SettingsMap m_Pdf2GoConv;
+  SettingsMap m_PexFilter;
+  SettingsMap m_PexFilterConv;
+  SettingsMap m_Tiff2Pdf;
+  SettingsMap m_Tiff2PdfConv;
+  SettingsMap m_TiffItFilter;
+  SettingsMap m_TiffItFilterConv;
+  SettingsMap m_MsOffice;
+  SettingsMap m_Ps;
+  SettingsMap m_Vdp;
+  SettingsMap m_DriverSettings;
+  SettingsMap m_ImpositionProperties;
+  SettingsMap m_ImposeDeliveryInfo;
+  SettingsMap m_ImposeInfo;
+  SettingsMap m_ImposeInfoVDP;
+
+  // Answers that do not change during one run, kept so that a run over
+  // thousands of folders asks the system once: the server's directory
+  // (convert/server_lookup) and resolved server names by address.
+  std::optional<wxString> m_ServerDirectory;
+  std::map<wxString, std::pair<bool, wxString>> m_ResolvedNames;
+};
+
+#endif  // HF_APP_MIGRATOR_H_

@@ -1,0 +1,8 @@
+#include "app/migrator.h"
+
+bool CHFMigrator::ConvertFilterSettings() {
+  ApplyPdfConversion();
+  return RegisterHotFolder();
+}
+
+void CHFMigrator::ApplyPdfConversion() {}

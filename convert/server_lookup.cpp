@@ -1,0 +1,5 @@
+#include "convert/server_lookup.h"
+
+bool ResolveServerName(const wxString&, wxString&) { return false; }
+
+void FindServerDirectory(wxString&) {}

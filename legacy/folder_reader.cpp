@@ -1,0 +1,3 @@
+#include "app/migrator.h"
+
+void CHFMigrator::MigrateFolders() {}

@@ -1,0 +1,3 @@
+#include "app/migrator.h"
+
+bool CHFMigrator::ReadLegacyList() { return false; }

@@ -1,0 +1,138 @@
+// What the migration tool needs of the operating system.
+//
+// Everything above this layer speaks Windows: paths are Windows paths
+// ("D:\Jobs\Brochures"), names are wide strings. Only the implementation
+// (posix.cpp or win32.cpp) turns a Windows path into a path of the host, at
+// the moment the file system is touched.
+//
+// Every service answers failure as "no" (false, empty, not found) and never
+// throws. The header holds no type of either host, so both implementations
+// are written against the same declarations.
+#ifndef HF_PLATFORM_PLATFORM_H_
+#define HF_PLATFORM_PLATFORM_H_
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace platform {
+
+// A path as the host's own file API takes it: UTF-16 on Windows, UTF-8
+// bytes on POSIX hosts.
+#ifdef _WIN32
+using HostPath = std::wstring;
+#else
+using HostPath = std::string;
+#endif
+
+// ---- Paths ----------------------------------------------------------------
+
+// Maps a Windows path to the host path that names the same file. On Windows
+// this is the identity. On POSIX hosts drives live in the Wine-style prefix
+// ($WINEPREFIX, else $HOME/.wine): "X:\rest" is "<prefix>/dosdevices/x:/rest",
+// "\\server\share\rest" is "<prefix>/dosdevices/unc/server/share/rest", a
+// relative path stays relative. "." and ".." are resolved in Windows form and
+// never climb above the drive or share root. A component missing in its exact
+// case is matched by a single directory entry that differs only in case.
+HostPath ToHostPath(const std::wstring& windows_path);
+
+// The reverse: a host path shown as a Windows path, through the drive whose
+// target holds it (longest match). A host path outside every drive keeps its
+// host form.
+std::wstring FromHostPath(const HostPath& host_path);
+
+// The all-users application-data folder, as a Windows path
+// ("C:\ProgramData").
+std::wstring CommonAppDataFolder();
+
+// Removes the last component and its separator, as PathRemoveFileSpecW does:
+// "C:\a\b.exe" gives "C:\a", "C:\b.exe" gives "C:\". Answers whether
+// anything was removed.
+bool RemoveFileSpec(std::wstring* path);
+
+// ---- Files ----------------------------------------------------------------
+
+constexpr std::uint32_t kAttributeReadOnly = 0x1;
+constexpr std::uint32_t kAttributeHidden = 0x2;
+constexpr std::uint32_t kAttributeSystem = 0x4;
+constexpr std::uint32_t kAttributeDirectory = 0x10;
+constexpr std::uint32_t kAttributeArchive = 0x20;
+
+// True when a regular file (not a directory) exists at the path.
+bool FileExists(const std::wstring& windows_path);
+
+// True when a directory exists at the path.
+bool DirectoryExists(const std::wstring& windows_path);
+
+// Creates the directory and its missing parents.
+bool CreateDirectories(const std::wstring& windows_path);
+
+// The file's attribute bits (kAttribute*). False when they cannot be read.
+bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes);
+
+// Sets the attribute bits; DIRECTORY is derived from the file and ignored.
+bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes);
+
+// Moves (renames) a directory. Fails, changing nothing, when the target
+// exists: an existing directory is never replaced.
+bool MoveDirectory(const std::wstring& from, const std::wstring& to);
+
+// ---- Named mutex ----------------------------------------------------------
+
+// True while some process holds a named mutex of that name that can be opened
+// with full access. The probe opens nothing for longer than the call.
+bool NamedMutexExists(const std::wstring& name);
+
+// Takes the named mutex for the rest of this process's life. False when
+// another process holds it already.
+bool HoldNamedMutex(const std::wstring& name);
+
+// ---- Processes ------------------------------------------------------------
+
+using ProcessId = std::uint32_t;
+
+// At most this many processes are examined by one enumeration.
+constexpr std::size_t kMaxProcesses = 1024;
+
+// Starts a program by bare file name, found by the host's executable search,
+// without waiting for it. Answers whether it was started.
+bool LaunchDetached(const std::wstring& file_name);
+
+// The identifiers of the running processes, at most kMaxProcesses of them, in
+// the host's enumeration order. False when the enumeration fails.
+bool EnumerateProcesses(std::vector<ProcessId>* ids);
+
+// Opens the process (query, read and terminate rights) and reads its first
+// module's base name and, when `file_name` is not null, the module's full
+// file name (shown as a Windows path where a drive holds it). False when the
+// process cannot be opened or its module cannot be queried.
+bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* file_name);
+
+// Ends the process unconditionally with exit code 0.
+bool TerminateProcess(ProcessId id);
+
+// ---- Registry -------------------------------------------------------------
+
+// True when the key (such as "SOFTWARE\Vendor\App") opens for reading under
+// HKEY_LOCAL_MACHINE.
+bool HklmKeyOpensForRead(const std::wstring& key);
+
+// ---- Network --------------------------------------------------------------
+
+// Starts the host's socket library where it needs starting.
+bool StartSockets();
+
+// The local host name, unshortened.
+bool LocalHostName(std::string* name);
+
+// The official name of a host looked up by name.
+bool HostByName(const std::string& name, std::string* official_name);
+
+// The official name of a host looked up in reverse by a dotted IPv4 address.
+// False when the text is not an address (the all-ones "no address" value) or
+// the lookup finds no entry.
+bool HostByIPv4Address(const std::string& dotted, std::string* official_name);
+
+}  // namespace platform
+
+#endif  // HF_PLATFORM_PLATFORM_H_

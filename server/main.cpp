@@ -1,0 +1,12 @@
+// hotfolder.exe: a stand-in for the hot-folder server. It holds the named
+// mutex "KYR Dirorodiv - Server" until it is terminated and does nothing
+// else. A second instance exits at once with status 1.
+#include <chrono>
+#include <thread>
+
+#include "platform/platform.h"
+
+int main() {
+  if (!platform::HoldNamedMutex(L"KYR Dirorodiv - Server")) return 1;
+  for (;;) std::this_thread::sleep_for(std::chrono::hours(1));
+}
