@@ -1,0 +1,43 @@
+#!/usr/bin/env bash
+# The demo: migrates the sample legacy installation in examples/legacy.
+#
+# It builds the tools, copies the sample into a fresh Wine-style prefix, runs
+# hfmigrate with no server running (so the tool starts the hotfolder.exe
+# stand-in, waits seven seconds, migrates, and stops it again), then shows
+# what the configuration store now holds and which legacy settings
+# directories were retired.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+scripts/setup.sh
+cmake -S . -B build -DHF_SANITIZE=ON -DCMAKE_BUILD_TYPE=Debug >/dev/null
+cmake --build build -j"$(nproc)" --target hfmigrate hotfolder_server hfstore >/dev/null
+
+prefix=$(mktemp -d "${TMPDIR:-/tmp}/hfdemo.XXXXXX")
+cp -r examples/legacy/drive_c examples/legacy/drive_d "$prefix/"
+mkdir "$prefix/dosdevices"
+ln -s ../drive_c "$prefix/dosdevices/c:"
+ln -s ../drive_d "$prefix/dosdevices/d:"
+export WINEPREFIX="$prefix"
+export PATH="$PWD/build/bin:$PATH"
+
+echo "Legacy installation: $prefix (C: is drive_c, D: is drive_d)"
+echo "Running hfmigrate (it starts the server and waits 7 seconds)..."
+status=0
+hfmigrate || status=$?
+echo "hfmigrate exited with status $status (always 255, that is -1, by design)."
+echo
+echo "Hot folders in the configuration store (enabled, name, folder, filter chain):"
+hfstore list
+echo
+echo "Legacy settings directories retired to [_KYR_HotFolder_Old]:"
+find "$prefix/drive_d" -mindepth 3 -maxdepth 3 -type d -name '\[_KYR_HotFolder_Old\]' \
+  | sed "s|^$prefix/drive_d/|  D:/|" | sort
+echo "Folders without legacy settings (not migrated):"
+for dir in "$prefix"/drive_d/Jobs/*/; do
+  if [ ! -e "$dir[_KYR_HotFolder_]" ] && [ ! -e "$dir[_KYR_HotFolder_Old]" ]; then
+    echo "  D:/${dir#"$prefix/drive_d/"}"
+  fi
+done
+echo
+echo "The full store as JSON: WINEPREFIX=$prefix build/bin/hfstore dump"
