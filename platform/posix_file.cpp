@@ -1,0 +1,125 @@
+// Files on a POSIX host. Attribute bits other than DIRECTORY live in the
+// "user.DOSATTRIB" extended attribute, in the hex-text form Wine writes, so a
+// Wine program and this tool see the same attributes.
+#include <errno.h>
+#include <fcntl.h>
+#include <stdio.h>
+#include <sys/stat.h>
+#include <sys/xattr.h>
+#include <unistd.h>
+
+#include <cstdlib>
+
+#include "platform/platform.h"
+#include "platform/posix_internal.h"
+
+namespace platform {
+namespace {
+
+constexpr char kAttributeName[] = "user.DOSATTRIB";
+
+bool StatWindowsPath(const std::wstring& windows_path, struct stat* st) {
+  const HostPath host = ToHostPath(windows_path);
+  return !host.empty() && stat(host.c_str(), st) == 0;
+}
+
+// Reads "0x<hex>" at the start of the attribute text. Anything else (such
+// as a value some other program wrote in its own form) counts as no bits.
+std::uint32_t ParseAttributeText(const char* text, size_t size) {
+  const std::string value(text, size);
+  if (value.size() < 3 || value[0] != '0' || (value[1] != 'x' && value[1] != 'X')) return 0;
+  char* end = nullptr;
+  errno = 0;
+  const unsigned long long bits = std::strtoull(value.c_str() + 2, &end, 16);
+  if (errno != 0 || end == value.c_str() + 2 || bits > 0xFFFFFFFFull) return 0;
+  return static_cast<std::uint32_t>(bits);
+}
+
+bool IsNoAttribute(int error) {
+  return error == ENODATA || error == ENOTSUP;
+}
+
+}  // namespace
+
+bool FileExists(const std::wstring& windows_path) {
+  // Only a regular file: a FIFO or device under that name would block or
+  // misbehave when a caller goes on to read it.
+  struct stat st;
+  return StatWindowsPath(windows_path, &st) && S_ISREG(st.st_mode);
+}
+
+bool DirectoryExists(const std::wstring& windows_path) {
+  struct stat st;
+  return StatWindowsPath(windows_path, &st) && S_ISDIR(st.st_mode);
+}
+
+bool CreateDirectories(const std::wstring& windows_path) {
+  const posix::MappedPath mapped = posix::MapWindowsPath(windows_path);
+  if (!mapped.valid) return false;
+  // The drive or share must exist already: creating a path never creates a
+  // drive, as on Windows.
+  struct stat st;
+  if (!mapped.root.empty() && (stat(mapped.root.c_str(), &st) != 0 || !S_ISDIR(st.st_mode))) {
+    return false;
+  }
+  std::string dir = mapped.root;
+  for (const std::string& part : mapped.parts) {
+    dir += (dir.empty() ? "" : "/") + part;
+    if (mkdir(dir.c_str(), 0777) == 0) continue;
+    if (errno != EEXIST || stat(dir.c_str(), &st) != 0 || !S_ISDIR(st.st_mode)) return false;
+  }
+  return true;
+}
+
+bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes) {
+  const HostPath host = ToHostPath(windows_path);
+  struct stat st;
+  if (attributes == nullptr || host.empty() || stat(host.c_str(), &st) != 0) return false;
+  char text[256];
+  const ssize_t size = getxattr(host.c_str(), kAttributeName, text, sizeof text);
+  std::uint32_t bits = 0;
+  if (size >= 0) {
+    bits = ParseAttributeText(text, static_cast<size_t>(size));
+  } else if (errno != ERANGE && !IsNoAttribute(errno)) {
+    return false;
+  }
+  bits &= ~kAttributeDirectory;
+  if (S_ISDIR(st.st_mode)) bits |= kAttributeDirectory;
+  *attributes = bits;
+  return true;
+}
+
+bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes) {
+  const HostPath host = ToHostPath(windows_path);
+  struct stat st;
+  if (host.empty() || stat(host.c_str(), &st) != 0) return false;
+  const std::uint32_t bits = attributes & ~kAttributeDirectory;
+  if (bits == 0) {
+    // No bits and no attribute read the same; a file system without
+    // extended attributes holds no bits already.
+    return removexattr(host.c_str(), kAttributeName) == 0 || IsNoAttribute(errno);
+  }
+  char text[16];
+  const int size = snprintf(text, sizeof text, "0x%x", static_cast<unsigned>(bits));
+  return setxattr(host.c_str(), kAttributeName, text, static_cast<size_t>(size), 0) == 0;
+}
+
+bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
+  const HostPath source = ToHostPath(from);
+  const HostPath target = ToHostPath(to);
+  if (source.empty() || target.empty()) return false;
+  if (renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, target.c_str(), RENAME_NOREPLACE) == 0) {
+    return true;
+  }
+  if (errno != EINVAL && errno != ENOSYS) return false;
+  // The file system cannot refuse to replace by itself. Reserving the name
+  // with mkdir is atomic, and rename replaces only that empty placeholder.
+  struct stat st;
+  if (stat(source.c_str(), &st) != 0 || !S_ISDIR(st.st_mode)) return false;
+  if (mkdir(target.c_str(), 0700) != 0) return false;
+  if (rename(source.c_str(), target.c_str()) == 0) return true;
+  rmdir(target.c_str());
+  return false;
+}
+
+}  // namespace platform

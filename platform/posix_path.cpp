@@ -1,0 +1,261 @@
+// Windows paths on a POSIX host: the Wine-style prefix mapping and the
+// Windows path helpers. This is the only place where a Windows path turns
+// into a host path.
+#include <dirent.h>
+#include <errno.h>
+#include <limits.h>
+#include <pwd.h>
+#include <stdlib.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "platform/platform.h"
+#include "platform/posix_internal.h"
+
+namespace platform {
+namespace posix {
+namespace {
+
+bool IsAsciiLetter(wchar_t c) {
+  return (c >= L'a' && c <= L'z') || (c >= L'A' && c <= L'Z');
+}
+
+// Adds the components of `rest` (backslash-separated) to `parts`. "." and
+// empty components vanish; ".." removes the previous component but never
+// one of the first `floor` (the share's server and name). In a rooted path a
+// ".." at the root is dropped, as Windows does, so no path leaves its drive;
+// a relative path keeps leading ".." components.
+void AddComponents(const std::wstring& rest, size_t floor, bool rooted,
+                   std::vector<std::wstring>* parts) {
+  size_t start = 0;
+  while (start <= rest.size()) {
+    size_t end = rest.find(L'\\', start);
+    if (end == std::wstring::npos) end = rest.size();
+    const std::wstring part = rest.substr(start, end - start);
+    start = end + 1;
+    if (part.empty() || part == L".") continue;
+    if (part != L"..") {
+      parts->push_back(part);
+    } else if (parts->size() > floor && parts->back() != L"..") {
+      parts->pop_back();
+    } else if (!rooted) {
+      parts->push_back(part);
+    }
+  }
+}
+
+// The entry of `dir` that `name` names: itself when it exists in that case,
+// else the single entry that differs from it only in case. Empty when there
+// is none (or more than one).
+std::string MatchEntry(const std::string& dir, const std::string& name) {
+  struct stat st;
+  if (lstat((dir + "/" + name).c_str(), &st) == 0) return name;
+  DIR* handle = opendir(dir.c_str());
+  if (handle == nullptr) return std::string();
+  const std::wstring wanted = Utf8ToWide(name);
+  std::string match;
+  int matches = 0;
+  while (const dirent* entry = readdir(handle)) {
+    if (EqualIgnoringCase(Utf8ToWide(entry->d_name), wanted)) {
+      match = entry->d_name;
+      ++matches;
+    }
+  }
+  closedir(handle);
+  return matches == 1 ? match : std::string();
+}
+
+// Turns the Windows components into host components below `root`, following
+// the case of existing entries for as long as the path exists.
+void ResolveParts(const std::vector<std::wstring>& windows_parts, MappedPath* mapped) {
+  std::string dir = mapped->root.empty() ? "." : mapped->root;
+  bool exists = true;
+  for (const std::wstring& windows_part : windows_parts) {
+    std::string part = WideToUtf8(windows_part);
+    if (exists) {
+      const std::string match = MatchEntry(dir, part);
+      exists = !match.empty();
+      if (exists) part = match;
+      dir += "/" + part;
+    }
+    mapped->parts.push_back(part);
+  }
+}
+
+// Splits a host path into its directory and last component.
+void SplitHostPath(const std::string& path, std::string* dir, std::string* name) {
+  const size_t slash = path.find_last_of('/');
+  *dir = slash == 0 ? "/" : path.substr(0, slash);
+  *name = path.substr(slash + 1);
+}
+
+// The canonical absolute form of a host path that may not exist yet: the
+// longest existing ancestor resolved, the rest appended as it is.
+std::string CanonicalHostPath(const std::string& path) {
+  std::string absolute = path;
+  if (absolute.empty() || absolute[0] != '/') {
+    char cwd[PATH_MAX];
+    if (getcwd(cwd, sizeof cwd) == nullptr) return std::string();
+    absolute = std::string(cwd) + "/" + absolute;
+  }
+  std::string suffix;
+  for (;;) {
+    if (char* resolved = realpath(absolute.c_str(), nullptr)) {
+      std::string result = resolved;
+      free(resolved);
+      if (!suffix.empty()) result += (result == "/" ? "" : "/") + suffix;
+      return result;
+    }
+    if (absolute == "/") return std::string();
+    std::string dir, name;
+    SplitHostPath(absolute, &dir, &name);
+    suffix = suffix.empty() ? name : name + "/" + suffix;
+    absolute = dir;
+  }
+}
+
+// Whether `path` lies within the directory `dir` (both canonical).
+bool IsWithin(const std::string& path, const std::string& dir) {
+  if (dir == "/") return true;
+  return path.compare(0, dir.size(), dir) == 0 &&
+         (path.size() == dir.size() || path[dir.size()] == '/');
+}
+
+}  // namespace
+
+std::string MappedPath::Join() const {
+  std::string path = root;
+  for (const std::string& part : parts) path += (path.empty() ? "" : "/") + part;
+  return path.empty() ? "." : path;
+}
+
+std::string PrefixDirectory() {
+  std::string prefix;
+  if (const char* wineprefix = getenv("WINEPREFIX"); wineprefix != nullptr && *wineprefix) {
+    prefix = wineprefix;
+  } else if (const char* home = getenv("HOME"); home != nullptr && *home) {
+    prefix = std::string(home) + "/.wine";
+  } else if (const passwd* user = getpwuid(getuid()); user != nullptr && user->pw_dir) {
+    prefix = std::string(user->pw_dir) + "/.wine";
+  }
+  while (prefix.size() > 1 && prefix.back() == '/') prefix.pop_back();
+  return prefix;
+}
+
+MappedPath MapWindowsPath(const std::wstring& windows_path) {
+  MappedPath mapped;
+  // The Windows file API reads a path up to its first NUL.
+  std::wstring path = windows_path.substr(0, windows_path.find(L'\0'));
+  for (wchar_t& c : path) {
+    if (c == L'/') c = L'\\';
+  }
+  if (path.empty()) return mapped;
+  const std::string prefix = PrefixDirectory();
+  std::vector<std::wstring> parts;
+  if (path.compare(0, 2, L"\\\\") == 0) {
+    // A share: its server and name are the root that ".." cannot leave.
+    const size_t server_end = path.find(L'\\', 2);
+    const size_t share_end =
+        path.find(L'\\', server_end == std::wstring::npos ? path.size() : server_end + 1);
+    if (server_end == std::wstring::npos) return mapped;
+    const std::wstring server = path.substr(2, server_end - 2);
+    const std::wstring share = path.substr(server_end + 1, share_end - server_end - 1);
+    for (const std::wstring& name : {server, share}) {
+      if (name.empty() || name == L"." || name == L"..") return mapped;
+    }
+    parts = {server, share};
+    if (share_end != std::wstring::npos) AddComponents(path.substr(share_end + 1), 2, true, &parts);
+    mapped.root = prefix + "/dosdevices/unc";
+  } else if (path.size() >= 2 && IsAsciiLetter(path[0]) && path[1] == L':') {
+    // "X:rest" has no current directory of its own here: it counts from X:\.
+    AddComponents(path.substr(2), 0, true, &parts);
+    mapped.root = prefix + "/dosdevices/" + static_cast<char>(FoldCase(path[0])) + ":";
+  } else if (path[0] == L'\\') {
+    // Rooted on "the current drive": there is none to take it from.
+    return mapped;
+  } else {
+    AddComponents(path, 0, false, &parts);
+  }
+  if (prefix.empty() && !mapped.root.empty()) return mapped;
+  ResolveParts(parts, &mapped);
+  mapped.valid = true;
+  return mapped;
+}
+
+bool CreateHostDirectories(const std::string& host_path) {
+  for (size_t slash = host_path.find('/', 1);; slash = host_path.find('/', slash + 1)) {
+    const std::string dir = host_path.substr(0, slash);
+    if (!dir.empty() && mkdir(dir.c_str(), 0777) != 0 && errno != EEXIST) return false;
+    if (slash == std::string::npos) break;
+  }
+  struct stat st;
+  return stat(host_path.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+}
+
+}  // namespace posix
+
+HostPath ToHostPath(const std::wstring& windows_path) {
+  const posix::MappedPath mapped = posix::MapWindowsPath(windows_path);
+  return mapped.valid ? mapped.Join() : HostPath();
+}
+
+std::wstring FromHostPath(const HostPath& host_path) {
+  if (host_path.empty()) return std::wstring();
+  const std::string path = posix::CanonicalHostPath(host_path);
+  const std::string devices = posix::PrefixDirectory() + "/dosdevices";
+  DIR* handle = path.empty() ? nullptr : opendir(devices.c_str());
+  if (handle == nullptr) return posix::Utf8ToWide(host_path);
+  std::string best_target;
+  char best_letter = 0;
+  while (const dirent* entry = readdir(handle)) {
+    const std::string name = entry->d_name;
+    if (name.size() != 2 || name[1] != ':' || !posix::IsAsciiLetter(name[0])) continue;
+    const std::string target = posix::CanonicalHostPath(devices + "/" + name);
+    if (target.empty() || !posix::IsWithin(path, target)) continue;
+    if (best_letter == 0 || target.size() > best_target.size()) {
+      best_target = target;
+      best_letter = name[0];
+    }
+  }
+  closedir(handle);
+  if (best_letter == 0) return posix::Utf8ToWide(host_path);
+  std::wstring windows;
+  windows.push_back(posix::FoldCase(best_letter) - L'a' + L'A');
+  windows += L":\\";
+  std::string rest = path.substr(best_target == "/" ? 1 : best_target.size());
+  if (!rest.empty() && rest[0] == '/') rest.erase(0, 1);
+  for (wchar_t c : posix::Utf8ToWide(rest)) windows.push_back(c == L'/' ? L'\\' : c);
+  return windows;
+}
+
+std::wstring CommonAppDataFolder() {
+  return L"C:\\ProgramData";
+}
+
+bool RemoveFileSpec(std::wstring* path) {
+  if (path == nullptr) return false;
+  std::wstring& p = *path;
+  // A host path that no drive holds keeps its host form (see FromHostPath);
+  // its separator is the slash, and a colon is an ordinary character in it.
+  const bool host_form = !p.empty() && p[0] == L'/';
+  const wchar_t separator = host_form ? L'/' : L'\\';
+  size_t i = 0;
+  size_t spec = 0;
+  // The root of "\name" or of a share "\\server\share" is not removed.
+  if (i < p.size() && p[i] == separator) spec = ++i;
+  if (i < p.size() && p[i] == separator) spec = ++i;
+  for (; i < p.size() && p[i] != L'\0'; ++i) {
+    if (p[i] == separator) {
+      spec = i;
+    } else if (p[i] == L':' && !host_form) {
+      // A drive and its root separator stay: "C:\b.exe" gives "C:\".
+      spec = i + 1;
+      if (i + 1 < p.size() && p[i + 1] == separator) spec = ++i + 1;
+    }
+  }
+  if (spec >= p.size() || p[spec] == L'\0') return false;
+  p.erase(spec);
+  return true;
+}
+
+}  // namespace platform
