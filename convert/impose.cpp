@@ -1,3 +1,229 @@
-#include "app/migrator.h"
+// Imposition settings: the legacy ImposeInfo, ImpositionProperties and
+// ImposeDeliveryInfo maps become the printer-description keywords of one hot
+// folder's imposition configuration.
+//
+// The legacy maps are only read (by Find, so nothing is inserted into them);
+// a key read while absent counts as empty text. Entries go into the result
+// only when their keyword is not there yet.
+#include <cmath>
+#include <cstddef>
+#include <cstdint>
 
-void CHFMigrator::ConvertImposeSettings(db::ImposeConfiguration&) {}
+#include "app/migrator.h"
+#include "convert/numbers.h"
+
+namespace {
+
+// A legacy word and the code the store knows it by.
+struct WordCode {
+  const char* word;
+  int code;
+};
+
+// A whole table: rows searched in order, whole text, ignoring case; the
+// first match decides and `otherwise` answers for everything else.
+struct CodeTable {
+  const WordCode* rows;
+  std::size_t count;
+  int otherwise;
+};
+
+template <std::size_t N>
+constexpr CodeTable Table(const WordCode (&rows)[N], int otherwise) {
+  return CodeTable{rows, N, otherwise};
+}
+
+// "GANGUPCOLLATE" comes before "GANGUPCOLLATEMULTI"; with whole-text
+// comparison the order decides nothing, but it is kept as the service has it.
+const WordCode kBindingRows[] = {
+    {"PERFECT", 2},      {"SADDLESTITCH", 3},   {"NESTEDSADDLESTITCH", 4},  {"GANGUPREPEAT", 5},
+    {"GANGUPUNIQUE", 6}, {"GANGUPCOLLATE", 10}, {"GANGUPCOLLATEMULTI", 11}, {"GANGUPSTACKNCUT", 12},
+};
+const WordCode kEdgeRows[] = {{"LEFT", 0}, {"RIGHT", 1}};
+const WordCode kYesNoRows[] = {{"YES", 1}, {"NO", 2}};
+const WordCode kOrientationRows[] = {{"LANDSCAPE", 2}, {"PORTRAIT", 1}};
+const WordCode kOutputSequenceRows[] = {{"DEFAULT", 0}, {"REVERSE", 1}};
+const WordCode kGangupRows[] = {
+    {"STANDARD", 1000}, {"HEAD2HEAD", 1001},          {"FOOT2FOOT", 1002},
+    {"REVERSAL", 1003}, {"REVERSAL_ALTERNATE", 1004},
+};
+
+const CodeTable kBinding = Table(kBindingRows, 0);
+const CodeTable kEdge = Table(kEdgeRows, -1);
+// A printer mark that is neither YES nor NO (absent included) still fills
+// its field in "QXImpMarks". The service defines no code for it; 0 is the
+// code auto-scale and watermarks use for "neither", so all three YES/NO
+// settings read the same way.
+const CodeTable kMark = Table(kYesNoRows, 0);
+const CodeTable kAutoScale = Table(kYesNoRows, 0);
+const CodeTable kWatermark = Table(kYesNoRows, 0);
+const CodeTable kOrientation = Table(kOrientationRows, -1);
+const CodeTable kOutputSequence = Table(kOutputSequenceRows, -1);
+const CodeTable kGangup = Table(kGangupRows, 0);
+
+int CodeOf(const CodeTable& table, const wxString& value) {
+  for (std::size_t i = 0; i < table.count; ++i) {
+    if (value.CmpNoCase(table.rows[i].word) == 0) return table.rows[i].code;
+  }
+  return table.otherwise;
+}
+
+wxString Decimal(long value) {
+  return wxString::Format("%ld", value);
+}
+
+// The store's fixed point: 16 fractional bits in a signed 32-bit integer,
+// handed over as the text of a double. A product that is not a number or
+// does not fit is the value x86 gives for a failed conversion, produced here
+// explicitly because the C++ conversion would be undefined.
+wxString FixedPoint(const wxString& text) {
+  double product = ReadDoubleOr0(text) * 65536.0;
+  std::int32_t fixed = INT32_MIN;
+  if (!std::isnan(product) && product > -2147483649.0 && product < 2147483648.0) {
+    fixed = static_cast<std::int32_t>(product);  // truncates toward zero
+  }
+  return FormatFixed(static_cast<double>(fixed));
+}
+
+// Reads one converted folder's legacy maps and writes its entries.
+class ImposeWriter {
+ public:
+  ImposeWriter(const CHFMigrator& engine, db::ImposeConfiguration& out)
+      : ii_(engine.m_ImposeInfo),
+        ip_(engine.m_ImpositionProperties),
+        di_(engine.m_ImposeDeliveryInfo),
+        out_(out) {}
+
+  void Put(const wxString& keyword, const wxString& value) {
+    out_.insert({keyword, db::ImposeSettingEntry{keyword, value}});
+  }
+
+  // Writers for a key that is present, whatever its value.
+  void Copy(const SettingsMap& from, const char* key, const wxString& keyword) {
+    if (const wxString* value = from.Find(key)) Put(keyword, *value);
+  }
+  void Code(const SettingsMap& from, const char* key, const wxString& keyword,
+            const CodeTable& table) {
+    if (const wxString* value = from.Find(key)) Put(keyword, Decimal(CodeOf(table, *value)));
+  }
+
+  static wxString Text(const SettingsMap& from, const wxString& key) {
+    const wxString* value = from.Find(key);
+    return value ? *value : wxString();
+  }
+
+  void Marks();
+  void LayoutAndGaps(bool zero_margins);
+  void ScaleBleedCreep();
+  void TemplateAndDelivery(CHFMigrator& engine);
+
+  const SettingsMap& ii_;
+  const SettingsMap& ip_;
+  const SettingsMap& di_;
+  db::ImposeConfiguration& out_;
+};
+
+void ImposeWriter::Marks() {
+  static const char* const kMarkKeys[] = {"ShowCropMarks", "ShowFoldLines", "ShowJobName",
+                                          "ShowSheetInfo", "ShowDateAndTime"};
+  wxString marks;
+  for (const char* key : kMarkKeys) {
+    if (!marks.empty()) marks += ' ';
+    marks += Decimal(CodeOf(kMark, Text(ii_, key)));
+  }
+  Put("QXImpMarks", marks);
+}
+
+// The gap list names its count twice, once before each direction. A gap
+// that is missing is left out without lowering the count, as the service
+// wrote it; the store reads what it was always sent.
+void ImposeWriter::LayoutAndGaps(bool zero_margins) {
+  wxString x = Text(ii_, "x");
+  wxString y = Text(ii_, "y");
+  Put("QXImpLayout", x + " " + y);
+
+  std::int32_t columns = ReadInt32(x);
+  std::int32_t rows = ReadInt32(y);
+  if (columns > 10 || rows > 10) return;
+
+  const int count = zero_margins ? 10 : 5;
+  wxString gaps;
+  for (const char* direction : {"HorizontalGap", "VerticalGap"}) {
+    gaps += Decimal(count) + " ";
+    for (int i = 0; i < count; ++i) {
+      if (const wxString* gap = ii_.Find(direction + Decimal(i))) gaps += *gap + " ";
+    }
+  }
+  Put("QXImpFdGaps", gaps);
+}
+
+void ImposeWriter::ScaleBleedCreep() {
+  Code(ii_, "AutoScale", "QXImpAutoPScal", kAutoScale);
+  if (const wxString* scale = ii_.Find("ScaleFactor")) {
+    Put("QXImpPageScale", *scale);
+    Put("QXImpFdPgScale", FixedPoint(*scale));
+  }
+  Code(ii_, "Orientation", "QXImpOrient", kOrientation);
+
+  // An absent vertical bleed leaves its half empty, not "0": the second
+  // field is the legacy text, and there is none.
+  if (const wxString* horizontal = ii_.Find("HorizontalBleed")) {
+    const wxString* vertical = ii_.Find("VerticalBleed");
+    Put("QXImpBleed", FixedPoint(*horizontal) + " " + (vertical ? FixedPoint(*vertical) : ""));
+    Put("QXImpFdBleed", *horizontal + " " + (vertical ? *vertical : ""));
+  }
+  if (const wxString* creep = ii_.Find("Creep")) {
+    wxString fixed = FixedPoint(*creep);
+    Put("QXImpCreeps", fixed + " " + fixed);
+    Put("QXImpFdCreeps", *creep + " " + *creep);
+  }
+  Copy(ii_, "CreepDirection", "QXImpCreepDir");
+}
+
+// A legacy template decides alone, even one outside the table (its entry is
+// then empty); only a custom imposition file brings delivery settings.
+void ImposeWriter::TemplateAndDelivery(CHFMigrator& engine) {
+  wxString legacy_template = Text(ip_, "Template");
+  if (!legacy_template.empty()) {
+    Put("QXImposeTemplate", engine.MapLegacyTemplate(legacy_template));
+    return;
+  }
+  if (Text(ip_, "ImpInfoFile").empty()) return;
+  Put("QXImposeTemplate", engine.MakeCustomTemplatePath());
+  Code(di_, "OutputSequence", "QXDeliverySeq", kOutputSequence);
+  Copy(di_, "SurfaceOrder", "QXDeliverySur");
+  Copy(di_, "NestedSaddleOutputSequence", "QXDeliveryNSSeq");
+}
+
+}  // namespace
+
+void CHFMigrator::ConvertImposeSettings(db::ImposeConfiguration& impose) {
+  ImposeWriter w(*this, impose);
+  w.Code(w.ii_, "Binding", "QXImpBinding", kBinding);
+  w.Put("QXImpThickness", "0");
+  w.Put("QXImpSpineFold", "0");
+  w.Copy(w.ii_, "GroupsOf", "QXImpPPGrp");
+  w.Code(w.ii_, "Edge", "QXImpBindEdge", kEdge);
+  w.Marks();
+  w.Copy(w.ip_, "FixedDuplexValue", "QXDuplex");
+  w.Copy(w.ip_, "CustomPageSize", "CustomPageSize");
+  w.Copy(w.ip_, "PageSize", "PageSize");
+  w.Copy(w.ip_, "PageRegion", "PageRegion");
+
+  bool zero_margins = ImposeWriter::Text(w.ip_, "ZeroMarginsSupport").CmpNoCase("TRUE") == 0;
+  w.LayoutAndGaps(zero_margins);
+  w.ScaleBleedCreep();
+  w.Code(w.ii_, "Watermarks", "QXImpWatermark", kWatermark);
+
+  // Only "1" is sent, as "True". "0" would pair with "False", but the
+  // service never sent that entry, and a store without it already treats
+  // the folder as having no zero margins; we add nothing it never received.
+  if (zero_margins && ImposeWriter::Text(w.ip_, "ZeroMargins") == "1") {
+    w.Put("QXImpZeroMargin", "True");
+  }
+  w.Put("QXImpFdValues", "1");
+  w.TemplateAndDelivery(*this);
+  w.Code(w.ii_, "GangupStyle", "QXGangupStyle", kGangup);
+  w.Copy(w.ii_, "FrontCover", "QXFrontCover");
+  w.Copy(w.ii_, "BackCover", "QXBackCover");
+}
