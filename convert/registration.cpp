@@ -1,11 +1,127 @@
 #include "convert/registration.h"
 
-#include "app/migrator.h"
+#include <wx/intl.h>
 
-wxXmlNode* BuildFilterElement(const SettingsMap&, const wxString& identifier) {
+#include "app/migrator.h"
+#include "convert/filter_chain.h"
+#include "convert/server_lookup.h"
+#include "convert/settings_dir.h"
+#include "store/store.h"
+
+namespace {
+
+// The queue word, from the legacy logical printer's name. The words pass
+// through the translation lookup as the rest of the user-visible texts do.
+wxString QueueWord(const wxString& logical_printer) {
+  wxString printer = logical_printer.Upper();
+  if (printer.Contains(wxGetTranslation("PRINT"))) return wxGetTranslation("print");
+  if (printer.Contains(wxGetTranslation("DIRECT"))) return wxGetTranslation("direct");
+  return wxGetTranslation("hold");
+}
+
+// A migration can hold thousands of folders naming the same few servers;
+// each address is asked once per run.
+bool ResolveCached(CHFMigrator& engine, const wxString& address, wxString* name) {
+  auto found = engine.m_ResolvedNames.find(address);
+  if (found == engine.m_ResolvedNames.end()) {
+    wxString resolved;
+    bool ok = ResolveServerName(address, resolved);
+    found = engine.m_ResolvedNames.emplace(address, std::make_pair(ok, resolved)).first;
+  }
+  if (!found->second.first) return false;
+  *name = found->second.second;
+  return true;
+}
+
+void FillServer(CHFMigrator& engine, db::Setting* setting) {
+  setting->ServerAddr = engine.m_FolderSettings.GetOrInsert("ServerAddr");
+  setting->ServerName = engine.m_FolderSettings.GetOrInsert("ServerName");
+  wxString resolved;
+  if (!ResolveCached(engine, setting->ServerAddr, &resolved)) return;
+  setting->ServerName = resolved;
+  if (setting->ServerAddr.empty()) setting->ServerAddr = resolved;
+}
+
+db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterChain& chain) {
+  db::Setting setting;
+  setting.Name = paths.name;
+  setting.FolderPath = paths.full_path;
+  setting.String1 = wxString();
+  setting.Queue = QueueWord(engine.m_FolderSettings.GetOrInsert("LogicalPrinter"));
+  setting.Queue2 = setting.Queue;
+  FillServer(engine, &setting);
+  setting.Flag1 = true;
+  setting.Flag2 = true;
+  setting.Flag3 = true;
+  setting.Flag4 = false;
+  setting.String3 = "10";
+  setting.Filters = std::move(chain.entries);
+  return setting;
+}
+
+// The store keeps the copies the driver knows as "num copies", whatever case
+// the legacy key was written in. The first of two keys that meet stays.
+db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
+  db::JobConfiguration job;
+  for (const SettingsMap::Entry& entry : driver_settings) {
+    wxString key = entry.first.IsSameAs("NumCopies", false) ? wxString("num copies") : entry.first;
+    job.emplace(key, db::JobSettingEntry{entry.first, entry.second, wxString()});
+  }
+  return job;
+}
+
+}  // namespace
+
+wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier) {
   auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, "Filter");
   filter->AddAttribute("name", identifier);
+  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, "UI");
+  // AddChild walks to the end each time; inserting after the last child
+  // keeps a large map linear.
+  wxXmlNode* last = nullptr;
+  for (const SettingsMap::Entry& entry : settings) {
+    auto* element = new wxXmlNode(wxXML_ELEMENT_NODE, entry.first);
+    element->AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(), entry.second));
+    ui->InsertChildAfter(element, last);
+    last = element;
+  }
+  filter->AddChild(ui);
   return filter;
 }
 
-bool CHFMigrator::RegisterHotFolder() { return false; }
+bool CHFMigrator::RegisterHotFolder() {
+  // Every record is complete before the settings directory moves, so the
+  // time in which the folder is neither legacy nor registered is only the
+  // store's own call.
+  FilterChain chain = BuildFilterChain(*this);
+  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert("HFFolderPath"));
+  db::Setting setting = MakeSetting(*this, paths, chain);
+  db::FilterConfiguration filter;
+  filter = *chain.root;
+  db::FolderConfiguration folder;
+  folder.FolderPath = m_FolderSettings.GetOrInsert("HFFolderPath");
+  folder.WorkFolder = paths.work;
+  folder.FailedFolder = paths.failed;
+  folder.MoveFolder = paths.move;
+  db::JobConfiguration job = MakeJobConfiguration(m_DriverSettings);
+  db::ImposeConfiguration impose;
+  if (!m_ImpositionProperties.Empty()) ConvertImposeSettings(impose);
+  db::PreflightConfiguration preflight;
+
+  Retirement retirement = RetireSettingsDirectory(paths);
+  bool registered = RODuriZudaze::GetInstance().CreateHotFolder(setting, folder, job, filter,
+                                                                impose, preflight) != 0;
+  // Nothing was created, so the legacy settings go back where a later run
+  // finds them.
+  if (!registered) RestoreSettingsDirectory(paths, retirement);
+  if (registered && !m_CurrentEnabled) {
+    registered = RODuriZudaze::GetInstance().DisableHotFolder(setting.FolderPath);
+  }
+
+  m_DriverSettings.Clear();
+  m_ImpositionProperties.Clear();
+  m_ImposeDeliveryInfo.Clear();
+  m_ImposeInfo.Clear();
+  m_ImposeInfoVDP.Clear();
+  return registered;
+}

@@ -1,0 +1,68 @@
+#include "convert/settings_dir.h"
+
+#include <wx/filename.h>
+
+#include "platform/platform.h"
+
+namespace {
+
+const char kSettingsDirName[] = "[_KYR_HotFolder_]";
+const char kRetiredDirName[] = "[_KYR_HotFolder_Old]";
+const char kSeparator[] = "\\";
+
+// Attributes that would make the move fail on Windows.
+constexpr std::uint32_t kBlockingAttributes =
+    platform::kAttributeReadOnly | platform::kAttributeSystem;
+
+std::optional<std::uint32_t> ReadAttributes(const wxString& path) {
+  std::uint32_t attributes = 0;
+  if (!platform::GetFileAttributes(path.ToStdWstring(), &attributes)) return std::nullopt;
+  return attributes;
+}
+
+void ClearBlockingAttributes(const wxString& path) {
+  std::optional<std::uint32_t> attributes = ReadAttributes(path);
+  if (!attributes || (*attributes & kBlockingAttributes) == 0) return;
+  platform::SetFileAttributes(path.ToStdWstring(), *attributes & ~kBlockingAttributes);
+}
+
+bool Move(const wxString& from, const wxString& to) {
+  return platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring());
+}
+
+}  // namespace
+
+FolderPaths MakeFolderPaths(const wxString& folder_path) {
+  wxFileName file_name(folder_path, wxPATH_WIN);
+  FolderPaths paths;
+  paths.full_path = file_name.GetFullPath(wxPATH_WIN);
+  paths.name = file_name.GetName();
+  paths.settings = paths.full_path + kSeparator + kSettingsDirName;
+  paths.work = paths.settings + kSeparator + "[WorkFolder]";
+  paths.failed = paths.settings + kSeparator + "[FailedFolder]";
+  paths.move = paths.settings + kSeparator + "[MoveFolder]";
+  paths.retired = paths.full_path + kSeparator + kRetiredDirName;
+  return paths;
+}
+
+Retirement RetireSettingsDirectory(const FolderPaths& paths) {
+  Retirement retirement;
+  retirement.attributes = ReadAttributes(paths.settings);
+  ClearBlockingAttributes(paths.settings);
+  retirement.moved = Move(paths.settings, paths.retired);
+  if (!retirement.moved) {
+    ClearBlockingAttributes(paths.settings);
+    retirement.moved = Move(paths.settings, paths.retired);
+  }
+  return retirement;
+}
+
+void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retirement) {
+  if (!retirement.moved) return;
+  // A failed move back leaves the directory where it is; there is nothing
+  // safer to do with it.
+  if (!Move(paths.retired, paths.settings)) return;
+  if (retirement.attributes) {
+    platform::SetFileAttributes(paths.settings.ToStdWstring(), *retirement.attributes);
+  }
+}
