@@ -33,20 +33,43 @@ constexpr CodeTable Table(const WordCode (&rows)[N], int otherwise) {
   return CodeTable{rows, N, otherwise};
 }
 
+// clang-format off
 // "GANGUPCOLLATE" comes before "GANGUPCOLLATEMULTI"; with whole-text
 // comparison the order decides nothing, but it is kept as the service has it.
 const WordCode kBindingRows[] = {
-    {"PERFECT", 2},      {"SADDLESTITCH", 3},   {"NESTEDSADDLESTITCH", 4},  {"GANGUPREPEAT", 5},
-    {"GANGUPUNIQUE", 6}, {"GANGUPCOLLATE", 10}, {"GANGUPCOLLATEMULTI", 11}, {"GANGUPSTACKNCUT", 12},
+    {"PERFECT",            2},
+    {"SADDLESTITCH",       3},
+    {"NESTEDSADDLESTITCH", 4},
+    {"GANGUPREPEAT",       5},
+    {"GANGUPUNIQUE",       6},
+    {"GANGUPCOLLATE",      10},
+    {"GANGUPCOLLATEMULTI", 11},
+    {"GANGUPSTACKNCUT",    12},
 };
-const WordCode kEdgeRows[] = {{"LEFT", 0}, {"RIGHT", 1}};
-const WordCode kYesNoRows[] = {{"YES", 1}, {"NO", 2}};
-const WordCode kOrientationRows[] = {{"LANDSCAPE", 2}, {"PORTRAIT", 1}};
-const WordCode kOutputSequenceRows[] = {{"DEFAULT", 0}, {"REVERSE", 1}};
+const WordCode kEdgeRows[] = {
+    {"LEFT",  0},
+    {"RIGHT", 1},
+};
+const WordCode kYesNoRows[] = {
+    {"YES", 1},
+    {"NO",  2},
+};
+const WordCode kOrientationRows[] = {
+    {"LANDSCAPE", 2},
+    {"PORTRAIT",  1},
+};
+const WordCode kOutputSequenceRows[] = {
+    {"DEFAULT", 0},
+    {"REVERSE", 1},
+};
 const WordCode kGangupRows[] = {
-    {"STANDARD", 1000}, {"HEAD2HEAD", 1001},          {"FOOT2FOOT", 1002},
-    {"REVERSAL", 1003}, {"REVERSAL_ALTERNATE", 1004},
+    {"STANDARD",           1000},
+    {"HEAD2HEAD",          1001},
+    {"FOOT2FOOT",          1002},
+    {"REVERSAL",           1003},
+    {"REVERSAL_ALTERNATE", 1004},
 };
+// clang-format on
 
 const CodeTable kBinding = Table(kBindingRows, 0);
 const CodeTable kEdge = Table(kEdgeRows, -1);
