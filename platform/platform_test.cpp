@@ -5,13 +5,16 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <cwctype>
 #include <filesystem>
 #include <fstream>
 #include <functional>
 #include <string>
 #include <thread>
+#include <vector>
 
 #ifdef _WIN32
 #define WIN32_LEAN_AND_MEAN
@@ -27,6 +30,8 @@
 #include <sys/wait.h>
 #include <sys/xattr.h>
 #include <unistd.h>
+
+extern char** environ;
 
 #include "tests/temp_prefix.h"
 #endif
@@ -44,6 +49,8 @@ class Scratch {
     wchar_t temp[MAX_PATH + 1];
     GetTempPathW(MAX_PATH + 1, temp);
     static int count = 0;
+    wchar_t long_temp[MAX_PATH + 1];  // the long form, as module paths are shown
+    if (GetLongPathNameW(temp, long_temp, MAX_PATH + 1) != 0) wcscpy(temp, long_temp);
     root_ = std::wstring(temp) + L"hfplatform." + std::to_wstring(GetCurrentProcessId()) + L"." +
             std::to_wstring(++count);
 #else
@@ -71,6 +78,141 @@ class Scratch {
 #endif
   std::wstring root_;
 };
+
+// Polls a condition for up to ten seconds.
+bool Eventually(const std::function<bool()>& condition) {
+  for (int i = 0; i < 500; ++i) {
+    if (condition()) return true;
+    std::this_thread::sleep_for(std::chrono::milliseconds(20));
+  }
+  return condition();
+}
+
+// The built server stand-in, from the directory ctest names in HF_BIN_DIR.
+HostPath ServerProgram() {
+#ifdef _WIN32
+  const wchar_t* dir = _wgetenv(L"HF_BIN_DIR");
+  return dir ? std::wstring(dir) + L"\\hotfolder.exe" : std::wstring();
+#else
+  const char* dir = getenv("HF_BIN_DIR");
+  return dir ? std::string(dir) + "/hotfolder.exe" : std::string();
+#endif
+}
+
+// A child process of the test, started from a host path.
+class Child {
+ public:
+  explicit Child(const HostPath& program) {
+#ifdef _WIN32
+    STARTUPINFOW startup = {};
+    startup.cb = sizeof startup;
+    std::wstring command = L"\"" + program + L"\"";
+    started_ = CreateProcessW(program.c_str(), command.data(), nullptr, nullptr, FALSE, 0, nullptr,
+                              nullptr, &startup, &info_) != 0;
+#else
+    char* argv[] = {const_cast<char*>(program.c_str()), nullptr};
+    started_ = posix_spawn(&pid_, program.c_str(), nullptr, nullptr, argv, environ) == 0;
+#endif
+  }
+  ~Child() {
+    int ignored;
+    if (started_ && !ended_) platform::TerminateProcess(id());
+    if (started_ && !ended_) WaitForEnd(&ignored);
+  }
+  Child(const Child&) = delete;
+  Child& operator=(const Child&) = delete;
+
+  bool started() const {
+    return started_;
+  }
+#ifdef _WIN32
+  platform::ProcessId id() const {
+    return info_.dwProcessId;
+  }
+#else
+  platform::ProcessId id() const {
+    return static_cast<platform::ProcessId>(pid_);
+  }
+#endif
+
+  // Waits up to ten seconds for the end; `status` is the exit status, or -1
+  // after a signal.
+  bool WaitForEnd(int* status) {
+#ifdef _WIN32
+    if (WaitForSingleObject(info_.hProcess, 10000) != WAIT_OBJECT_0) return false;
+    DWORD code = 0;
+    GetExitCodeProcess(info_.hProcess, &code);
+    CloseHandle(info_.hProcess);
+    CloseHandle(info_.hThread);
+    *status = static_cast<int>(code);
+#else
+    int raw = 0;
+    if (!Eventually([&] { return waitpid(pid_, &raw, WNOHANG) == pid_; })) return false;
+    *status = WIFEXITED(raw) ? WEXITSTATUS(raw) : -1;
+#endif
+    ended_ = true;
+    return true;
+  }
+
+ private:
+  bool started_ = false;
+  bool ended_ = false;
+#ifdef _WIN32
+  PROCESS_INFORMATION info_ = {};
+#else
+  pid_t pid_ = 0;
+#endif
+};
+
+// Puts a directory in front of the executable search path while it lives.
+class SearchPathFirst {
+ public:
+  explicit SearchPathFirst(const HostPath& dir) {
+#ifdef _WIN32
+    const wchar_t* old = _wgetenv(L"PATH");
+    old_ = old ? old : L"";
+    SetEnvironmentVariableW(L"PATH", (dir + L";" + old_).c_str());
+    _wputenv_s(L"PATH", (dir + L";" + old_).c_str());
+#else
+    const char* old = getenv("PATH");
+    old_ = old ? old : "";
+    setenv("PATH", (dir + ":" + old_).c_str(), 1);
+#endif
+  }
+  ~SearchPathFirst() {
+#ifdef _WIN32
+    SetEnvironmentVariableW(L"PATH", old_.c_str());
+    _wputenv_s(L"PATH", old_.c_str());
+#else
+    setenv("PATH", old_.c_str(), 1);
+#endif
+  }
+
+ private:
+  HostPath old_;
+};
+
+bool SamePathIgnoringCase(const std::wstring& a, const std::wstring& b) {
+  if (a.size() != b.size()) return false;
+  for (size_t i = 0; i < a.size(); ++i) {
+    if (towlower(a[i]) != towlower(b[i])) return false;
+  }
+  return true;
+}
+
+// The first process whose module is the file `windows_path`; 0 when none.
+platform::ProcessId FindProcessOf(const std::wstring& windows_path) {
+  std::vector<platform::ProcessId> ids;
+  if (!platform::EnumerateProcesses(&ids)) return 0;
+  for (platform::ProcessId id : ids) {
+    std::wstring base_name, file_name;
+    if (platform::QueryProcessModule(id, &base_name, &file_name) &&
+        SamePathIgnoringCase(file_name, windows_path)) {
+      return id;
+    }
+  }
+  return 0;
+}
 
 TEST(PathTest, RemoveFileSpecActsLikeTheShell) {
   struct Case {
@@ -195,6 +337,92 @@ TEST(FileTest, MoveNeverReplacesAnExistingDirectory) {
   EXPECT_FALSE(platform::MoveDirectory(scratch.Path(L"missing"), scratch.Path(L"other")));
 }
 
+TEST(MutexTest, ExistsExactlyWhileTheServerHoldsIt) {
+  Scratch scratch;  // on a POSIX host this is also a prefix of our own
+  const HostPath program = ServerProgram();
+  ASSERT_FALSE(program.empty()) << "HF_BIN_DIR must name the directory of hotfolder.exe";
+  const std::wstring name = L"KYR Dirorodiv - Server";
+  EXPECT_FALSE(platform::NamedMutexExists(name));
+  Child server(program);
+  ASSERT_TRUE(server.started());
+  ASSERT_TRUE(Eventually([&] { return platform::NamedMutexExists(name); }));
+  EXPECT_TRUE(platform::NamedMutexExists(name));  // a probe does not take it
+  EXPECT_FALSE(platform::NamedMutexExists(L"KYR Dirorodiv - Server2"));
+
+  Child second(program);
+  int status = 0;
+  ASSERT_TRUE(second.WaitForEnd(&status));
+  EXPECT_EQ(status, 1);
+  EXPECT_TRUE(platform::NamedMutexExists(name));
+
+  ASSERT_TRUE(platform::TerminateProcess(server.id()));
+  ASSERT_TRUE(server.WaitForEnd(&status));
+  EXPECT_TRUE(Eventually([&] { return !platform::NamedMutexExists(name); }));
+}
+
+TEST(MutexTest, HoldingInThisProcess) {
+  Scratch scratch;
+  const std::wstring name = L"Local\\hf platform/test \u00fc " + std::to_wstring(__LINE__);
+  EXPECT_FALSE(platform::NamedMutexExists(name));
+  ASSERT_TRUE(platform::HoldNamedMutex(name));
+  EXPECT_TRUE(platform::HoldNamedMutex(name));  // ours already
+  EXPECT_TRUE(platform::NamedMutexExists(name));
+  EXPECT_FALSE(platform::NamedMutexExists(L""));
+  EXPECT_FALSE(platform::HoldNamedMutex(L""));
+}
+
+TEST(ProcessTest, LaunchedServerIsFoundByNameAndPathAndTerminated) {
+  Scratch scratch;
+  const HostPath program = ServerProgram();
+  ASSERT_FALSE(program.empty()) << "HF_BIN_DIR must name the directory of hotfolder.exe";
+  // A private copy: only the process started here can have its path.
+  ASSERT_TRUE(platform::CreateDirectories(scratch.Path(L"bin")));
+  const std::wstring copy = scratch.Path(L"bin\\hotfolder.exe");
+  fs::copy_file(fs::path(program), fs::path(platform::ToHostPath(copy)));
+  // Canonical: a POSIX search path cannot hold the colon of "dosdevices/d:".
+  SearchPathFirst search(
+      fs::canonical(fs::path(platform::ToHostPath(scratch.Path(L"bin")))).native());
+
+  EXPECT_FALSE(platform::LaunchDetached(L"hf-no-such-program.exe"));
+  ASSERT_TRUE(platform::LaunchDetached(L"hotfolder.exe"));
+  ASSERT_TRUE(Eventually([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); }));
+  platform::ProcessId id = 0;
+  ASSERT_TRUE(Eventually([&] { return (id = FindProcessOf(copy)) != 0; }));
+  std::wstring base_name;
+  ASSERT_TRUE(platform::QueryProcessModule(id, &base_name, nullptr));
+  EXPECT_EQ(base_name, L"hotfolder.exe");
+
+  std::vector<platform::ProcessId> ids;
+  ASSERT_TRUE(platform::EnumerateProcesses(&ids));
+  EXPECT_LE(ids.size(), platform::kMaxProcesses);
+#ifndef _WIN32
+  EXPECT_TRUE(std::is_sorted(ids.begin(), ids.end()));  // POSIX host: ascending ids
+#endif
+
+  ASSERT_TRUE(platform::TerminateProcess(id));
+  EXPECT_TRUE(Eventually([] { return !platform::NamedMutexExists(L"KYR Dirorodiv - Server"); }));
+  EXPECT_TRUE(Eventually([&] { return FindProcessOf(copy) == 0; }));
+  EXPECT_FALSE(platform::QueryProcessModule(0, &base_name, nullptr));
+  EXPECT_FALSE(platform::QueryProcessModule(0xFFFFFFFFu, &base_name, nullptr));
+}
+
+TEST(NetworkTest, ResolvesTheLocalHost) {
+  ASSERT_TRUE(platform::StartSockets());
+  std::string name;
+  EXPECT_TRUE(platform::LocalHostName(&name));
+  EXPECT_FALSE(name.empty());
+  std::string official;
+  EXPECT_TRUE(platform::HostByName("localhost", &official));
+  EXPECT_FALSE(official.empty());
+  official.clear();
+  EXPECT_TRUE(platform::HostByIPv4Address("127.0.0.1", &official));
+  EXPECT_FALSE(official.empty());
+  std::string kept = "kept";
+  EXPECT_FALSE(platform::HostByIPv4Address("not an address", &kept));
+  EXPECT_FALSE(platform::HostByIPv4Address("255.255.255.255", &kept));  // the "no address" value
+  EXPECT_EQ(kept, "kept");
+}
+
 #ifndef _WIN32
 // POSIX host: the Wine-style prefix mapping.
 TEST(PrefixTest, MapsWindowsPathsIntoThePrefix) {
@@ -264,6 +492,58 @@ TEST(PrefixTest, NeverCreatesADrive) {
   EXPECT_EQ(platform::CommonAppDataFolder(), L"C:\\ProgramData");
   EXPECT_TRUE(platform::CreateDirectories(L"C:\\ProgramData\\KYR\\Dirorodiv"));
   EXPECT_TRUE(fs::is_directory(prefix.Drive('c') / "ProgramData" / "KYR" / "Dirorodiv"));
+}
+
+// POSIX host: kill() reads 0 as "my process group"; such ids are refused. The
+// check runs in a child with a group of its own, so a failure ends only that.
+TEST(ProcessTest, TerminateRefusesProcessGroupIds) {
+  const pid_t child = fork();
+  if (child == 0) {
+    setpgid(0, 0);
+    _exit(platform::TerminateProcess(0) ? 2 : 0);
+  }
+  int status = 0;
+  ASSERT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
+}
+
+// POSIX host: HKEY_LOCAL_MACHINE is the prefix's system.reg.
+TEST(RegistryTest, ReadsTheWineSystemHive) {
+  TempPrefix prefix;
+  const std::wstring product = L"SOFTWARE\\Wow6432Node\\Tessaly Systems\\Corvane_app\\3.0";
+  EXPECT_FALSE(platform::HklmKeyOpensForRead(product));  // no hive at all
+  prefix.WriteFile(prefix.root() / "system.reg",
+                   "WINE REGISTRY Version 2\n"
+                   ";; All keys relative to \\\\Machine\n\n#arch=win64\n\n"
+                   "[Software\\\\Wow6432Node\\\\Tessaly Systems\\\\Corvane_app\\\\3.0\\\\Paths] "
+                   "1700000000\n#time=1d9a0b2c3d4e5f6\n\"Dir\"=\"C:\\\\x\"\n\n"
+                   "[Software\\\\Vendor\\\\App\\\\3.01] 1700000000\n"
+                   "[Software\\\\Vendor\\\\Other\\\\3.0x] 1700000000\n"
+                   "[Software\\\\Vendor\\\\Br\\[ack\\]et\\x00fc] 1700000000\n"
+                   "[Software\\\\Unclosed\n");
+  struct Case {
+    std::wstring key;
+    bool opens;
+  };
+  const Case cases[] = {
+      {product, true},  // a parent of a section
+      {L"software\\wow6432node\\TESSALY SYSTEMS\\corvane_app\\3.0\\paths", true},
+      {L"SOFTWARE", true},
+      {L"SOFTWARE\\Wow6432Node\\Tessaly Systems\\Corvane_app\\3", false},
+      {L"SOFTWARE\\Vendor\\App\\3.0", false},  // only a sibling "3.01"
+      {L"SOFTWARE\\Vendor\\Other\\3.0", false},
+      {L"SOFTWARE\\Vendor\\App\\3.01\\Below", false},
+      {L"SOFTWARE\\Vendor\\Br[ack]et\u00dc", true},  // escapes, and case beyond ASCII
+      {L"SOFTWARE\\Unclosed", false},
+      {L"SOFTWARE\\Missing", false},
+  };
+  for (const Case& c : cases) EXPECT_EQ(platform::HklmKeyOpensForRead(c.key), c.opens) << c.key;
+
+  // Any bytes at all give an answer.
+  std::string noise = "[\\x\\\\\\[\\xd800\\xdc00]\n[\\";
+  for (int i = 0; i < 4096; ++i) noise.push_back(static_cast<char>((i * 7919) % 256));
+  prefix.WriteFile(prefix.root() / "system.reg", noise);
+  EXPECT_FALSE(platform::HklmKeyOpensForRead(product));
 }
 #endif
 
