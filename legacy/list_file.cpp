@@ -1,3 +1,89 @@
-#include "app/migrator.h"
+// The legacy hot-folder list: a 40-byte header and 264-byte folder records,
+// written by the previous generation of the service for all users.
+#include <wx/app.h>
+#include <wx/strconv.h>
 
-bool CHFMigrator::ReadLegacyList() { return false; }
+#include <cstring>
+#include <fstream>
+
+#include "app/migrator.h"
+#include "legacy/cp1252.h"
+#include "platform/platform.h"
+
+namespace {
+
+constexpr char kMagic[] = "KYR ZerOvurova Database";
+constexpr unsigned char kVersion = 1;
+constexpr std::size_t kHeaderSize = 40;
+constexpr std::size_t kMagicSize = 24;
+constexpr std::size_t kRecordSize = 264;
+constexpr std::size_t kStateOffset = 2;
+constexpr std::size_t kPathOffset = 4;
+constexpr std::size_t kPathSize = 260;
+constexpr unsigned kStateEnabled = 2;
+
+// The all-users configuration directory as wxStandardPaths::GetConfigDir
+// names it on Windows: the common application-data folder and the
+// application's name.
+wxString AllUsersConfigDir(const wxString& common_app_data) {
+  wxAppConsole* app = wxAppConsole::GetInstance();
+  wxString app_name = app ? app->GetAppName() : wxString("hfmigrate");
+  return common_app_data + "\\" + app_name;
+}
+
+// The list file sits beside the configuration directory, not inside it.
+wxString LegacyListPath(const wxString& common_app_data) {
+  wxString dir = AllUsersConfigDir(common_app_data).BeforeLast('\\');
+  return dir + "\\KYR\\ZerOvurova\\KYR ZerOvurova Preferences\\KYR ZerOvurova DB";
+}
+
+bool HeaderIsValid(const char* header) {
+  // The magic must end at byte 23; memcmp over the terminator checks both.
+  return std::memcmp(header, kMagic, sizeof(kMagic)) == 0 &&
+         static_cast<unsigned char>(header[kMagicSize]) == kVersion;
+}
+
+// The path ends at its first zero byte, or at the end of the field when the
+// writer filled all of it.
+wxString DecodePath(const char* field) {
+  const void* zero = std::memchr(field, '\0', kPathSize);
+  std::size_t length = zero ? static_cast<const char*>(zero) - field : kPathSize;
+#ifdef _WIN32
+  return wxString(field, wxConvLibc, length);
+#else
+  return DecodeCp1252(field, length);
+#endif
+}
+
+unsigned RecordState(const char* record) {
+  const unsigned char* state = reinterpret_cast<const unsigned char*>(record + kStateOffset);
+  return state[0] | (state[1] << 8);
+}
+
+}  // namespace
+
+bool CHFMigrator::ReadLegacyList() {
+  // Without the folder the path would fall back to the root of the current
+  // drive, which is not where the legacy service kept its list.
+  wxString common_app_data(platform::CommonAppDataFolder());
+  if (common_app_data.empty()) return false;
+  wxString path = LegacyListPath(common_app_data);
+  std::ifstream in(platform::ToHostPath(path.ToStdWstring()), std::ios::binary);
+  if (!in) return false;
+
+  char header[kHeaderSize];
+  if (!in.read(header, kHeaderSize) || !HeaderIsValid(header)) return false;
+
+  // Only whole records count; a torn write at the end leaves a partial one,
+  // which is ignored rather than read as a truncated path.
+  bool read_any = false;
+  char record[kRecordSize];
+  while (in.read(record, kRecordSize)) {
+    read_any = true;
+    wxString path = DecodePath(record + kPathOffset);
+    if (path.empty()) continue;
+    m_Folders.Add(path);
+    m_EnabledFlags.Add(RecordState(record) == kStateEnabled ? "1" : "0");
+  }
+  return read_any;
+}
