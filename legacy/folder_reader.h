@@ -1,0 +1,30 @@
+// Reading one legacy folder's folder.cfg into the engine's settings maps,
+// and the per-folder loop that hands each folder to conversion.
+#ifndef HF_LEGACY_FOLDER_READER_H_
+#define HF_LEGACY_FOLDER_READER_H_
+
+#include <wx/string.h>
+#include <wx/xml/xml.h>
+
+#include <cstddef>
+
+#include "app/migrator.h"
+#include "app/settings_map.h"
+
+// The first element named `name` below `start` (never `start` itself): a
+// direct child of `start` wins; failing that, the first child subtree in
+// document order that holds a match, however deep. Null when none matches.
+wxXmlNode* FindElement(wxXmlNode* start, const wxString& name);
+
+// Sets map[child name] = text for every child of `section` whose first child
+// carries a non-empty text. A null section changes nothing.
+void ReadSection(const wxXmlNode* section, SettingsMap& map);
+
+// Reads folder `index` of the engine's folder list: empties every settings
+// map, sets "HFFolderPath", reads the sections of its folder.cfg and sets the
+// current enabled flag. An unreadable folder.cfg leaves the maps holding
+// "HFFolderPath" alone. False, changing nothing, when the folder has no
+// folder.cfg.
+bool ReadFolderConfiguration(CHFMigrator& engine, std::size_t index);
+
+#endif  // HF_LEGACY_FOLDER_READER_H_

@@ -1,0 +1,28 @@
+// Loading a legacy folder.cfg within bounds the reader can handle.
+//
+// wxXmlDocument builds its tree and frees it by recursion, so a document
+// nested deeply enough would overflow the stack before the reader could look
+// at it; a huge one would exhaust memory. Such documents are refused before a
+// tree is built, and count as unreadable like any malformed file.
+#ifndef HF_LEGACY_XML_LOAD_H_
+#define HF_LEGACY_XML_LOAD_H_
+
+#include <wx/string.h>
+#include <wx/xml/xml.h>
+
+#include <cstddef>
+#include <string>
+
+constexpr std::size_t kMaxConfigBytes = 64u << 20;
+constexpr int kMaxConfigDepth = 256;
+
+// True when the document's elements nest no deeper than kMaxConfigDepth and
+// the bytes are well-formed XML.
+bool XmlWithinBounds(const std::string& bytes);
+
+// Loads the file at a Windows path into `doc`, encoding "UTF-8", dropping
+// text nodes that hold only white space. False, with nothing logged, when
+// the file cannot be read, is too large or too deep, or has no root element.
+bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc);
+
+#endif  // HF_LEGACY_XML_LOAD_H_
