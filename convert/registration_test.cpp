@@ -9,7 +9,6 @@
 
 #include <chrono>
 #include <filesystem>
-#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
@@ -30,35 +29,29 @@ void PrintTo(const wxString& text, std::ostream* os) {
 
 namespace {
 
+using namespace platform;
+
 const char kSettingsDir[] = "[_KYR_HotFolder_]";
 const char kRetiredDir[] = "[_KYR_HotFolder_Old]";
 
-std::uint32_t Attributes(const fs::path& host_dir, const std::string& windows_dir) {
+std::uint32_t AttributesOf(const std::string& windows_path) {
   std::uint32_t attributes = 0;
-  EXPECT_TRUE(fs::is_directory(host_dir)) << host_dir;
-  EXPECT_TRUE(platform::GetFileAttributes(wxString(windows_dir).ToStdWstring(), &attributes));
-  return attributes & ~platform::kAttributeDirectory;
+  EXPECT_TRUE(GetFileAttributes(wxString(windows_path).ToStdWstring(), &attributes));
+  return attributes & ~kAttributeDirectory;
 }
 
-// A filter of the stored "FilterSetting" tree: its name and its settings.
-struct StoredFilter {
-  wxString name;
-  std::vector<std::pair<wxString, wxString>> settings;
-  bool operator==(const StoredFilter& o) const { return name == o.name && settings == o.settings; }
-};
-
-std::vector<StoredFilter> ParseFilters(const wxString& xml) {
-  std::vector<StoredFilter> filters;
-  if (xml.empty()) return filters;
+// Each stored "Filter" as "name: key=value;key=value;".
+std::vector<wxString> ParseFilters(const wxString& xml) {
+  std::vector<wxString> filters;
   wxStringInputStream in(xml);
-  wxXmlDocument doc(in);
-  if (!doc.IsOk()) return filters;
+  wxXmlDocument doc;
+  if (xml.empty() || !doc.Load(in)) return filters;
   for (wxXmlNode* f = doc.GetRoot()->GetChildren(); f; f = f->GetNext()) {
-    StoredFilter filter{f->GetAttribute("name"), {}};
+    wxString text = f->GetAttribute("name") + ":";
     for (wxXmlNode* s = f->GetChildren()->GetChildren(); s; s = s->GetNext()) {
-      filter.settings.emplace_back(s->GetName(), s->GetNodeContent());
+      text << " " << s->GetName() << "=" << s->GetNodeContent() << ";";
     }
-    filters.push_back(filter);
+    filters.push_back(text);
   }
   return filters;
 }
@@ -67,10 +60,11 @@ std::vector<StoredFilter> ParseFilters(const wxString& xml) {
 class RegistrationTest : public ::testing::Test {
  protected:
   // Creates D:\Jobs\<name>\[_KYR_HotFolder_] and points the engine at it.
-  fs::path MakeFolder(const std::string& name) {
+  fs::path MakeFolder(const std::string& name, const char* folder_path = nullptr) {
     fs::path folder = prefix_.Drive('d') / "Jobs" / name;
     fs::create_directories(folder / kSettingsDir);
-    engine_.m_FolderSettings.GetOrInsert("HFFolderPath") = "D:\\Jobs\\" + name;
+    engine_.m_FolderSettings.GetOrInsert("HFFolderPath") =
+        folder_path ? wxString(folder_path) : "D:\\Jobs\\" + name;
     return folder;
   }
 
@@ -96,26 +90,18 @@ class RegistrationTest : public ::testing::Test {
   CHFMigrator engine_;
 };
 
-// "DisplayName/Identifier" of each link, space-separated.
-wxString ChainText(const std::vector<db::FilterEntry>& filters) {
-  wxString text;
-  for (const db::FilterEntry& e : filters)
-    text << (text.empty() ? "" : " ") << e.DisplayName << "/" << e.Identifier;
-  return text;
-}
-
 TEST_F(RegistrationTest, FilterChains) {
-  const char* kDefault = "PDF/KYR.PDF.1 PS/KYR.PS.1 TIFF/KYR.TIFF.1 VDP/KYR.VDP.1";
+  const char* kDefault = " PDF/KYR.PDF.1 PS/KYR.PS.1 TIFF/KYR.TIFF.1 VDP/KYR.VDP.1";
   struct Case {
     std::vector<const char*> enabled;
     wxString chain;
   } cases[] = {
       {{}, kDefault},
-      {{"JPEG2PDF"}, wxString("JPEG/KYR.JPEG.1 ") + kDefault},
-      {{"TIFF2PDF"}, "TIFF/KYR.TIFF.1 PDF/KYR.PDF.1 PS/KYR.PS.1 VDP/KYR.VDP.1"},
-      {{"MICROSOFT"}, wxString("Microsoft/KYR.MSOffice.1 ") + kDefault},
-      {{"EPS2PSFILTER", "JPEG2PDF"}, "EPS/KYR.EPS.1 JPEG/KYR.JPEG.1"},
-      {{"PDF2PS", "PEXFILTER"}, "PDF/KYR.PDF.1 PDF/KYR.PDF.1"},
+      {{"JPEG2PDF"}, wxString(" JPEG/KYR.JPEG.1") + kDefault},
+      {{"TIFF2PDF"}, " TIFF/KYR.TIFF.1 PDF/KYR.PDF.1 PS/KYR.PS.1 VDP/KYR.VDP.1"},
+      {{"MICROSOFT"}, wxString(" Microsoft/KYR.MSOffice.1") + kDefault},
+      {{"EPS2PSFILTER", "JPEG2PDF"}, " EPS/KYR.EPS.1 JPEG/KYR.JPEG.1"},
+      {{"PDF2PS", "PEXFILTER"}, " PDF/KYR.PDF.1 PDF/KYR.PDF.1"},
   };
   int n = 0;
   for (const Case& c : cases) {
@@ -124,111 +110,69 @@ TEST_F(RegistrationTest, FilterChains) {
     engine_.m_FilterEnable.GetOrInsert("DCS2FILTER") = "01";  // only exactly "1" enables
     for (const char* key : c.enabled) engine_.m_FilterEnable.GetOrInsert(key) = "1";
     engine_.m_Tiff2PdfConv.GetOrInsert("RESOLUTION") = "300";
-    engine_.m_PexFilterConv.GetOrInsert("JOBNAME") = "Proof";
+    engine_.m_PexFilterConv.GetOrInsert("JOBNAME") = " Proof 2 ";  // BuildFilterElement
+    engine_.m_PexFilterConv.GetOrInsert("NOTE") = "";              // keeps both exactly
     StoredHotFolder stored = Register();
-    EXPECT_EQ(ChainText(stored.setting.Filters), c.chain);
-    std::vector<StoredFilter> filters = ParseFilters(stored.filterConfiguration);
+    wxString chain;
+    for (const db::FilterEntry& e : stored.setting.Filters) {
+      chain << " " << e.DisplayName << "/" << e.Identifier;
+    }
+    EXPECT_EQ(chain, c.chain);
+    std::vector<wxString> filters = ParseFilters(stored.filterConfiguration);
     ASSERT_EQ(filters.size(), stored.setting.Filters.size()) << stored.filterConfiguration;
     for (size_t i = 0; i < filters.size(); ++i) {
-      EXPECT_EQ(filters[i].name, stored.setting.Filters[i].Identifier);
+      EXPECT_TRUE(filters[i].StartsWith(stored.setting.Filters[i].Identifier + ":"));
     }
 
     bool default_chain = c.chain.Contains("VDP");
-    bool tiff_fixed = default_chain && !c.chain.StartsWith("TIFF");
+    bool tiff_fixed = default_chain && !c.chain.StartsWith(" TIFF");
     EXPECT_EQ(engine_.m_PexFilterConv.Contains("ERRORPATH"), default_chain) << c.chain;
     EXPECT_EQ(engine_.m_Ps.Size(), default_chain ? 4u : 0u);
     EXPECT_EQ(engine_.m_Tiff2PdfConv.Size(), tiff_fixed ? 34u : 1u);
     EXPECT_EQ(*engine_.m_Tiff2PdfConv.Find("RESOLUTION"), tiff_fixed ? "600" : "300");
     if (default_chain && !filters.empty()) {
-      EXPECT_TRUE(filters.back().settings.empty());  // VDP
-    } else if (c.chain.StartsWith("PDF")) {
-      EXPECT_EQ(filters[0], filters[1]);
-      EXPECT_EQ(filters[0].settings.size(), 1u);
+      EXPECT_EQ(filters.back(), "KYR.VDP.1:");  // an empty map, an empty "UI"
+    }
+    if (c.chain.StartsWith(" PDF/KYR.PDF.1 PDF") && filters.size() == 2) {
+      EXPECT_EQ(filters[0], "KYR.PDF.1: JOBNAME= Proof 2 ; NOTE=;");
+      EXPECT_EQ(filters[1], filters[0]);
     }
   }
 }
 
-TEST(BuildFilterElementTest, OneChildPerSettingWithItsTextExactly) {
-  SettingsMap settings;
-  std::unique_ptr<wxXmlNode> empty(BuildFilterElement(settings, "KYR.VDP.1"));
-  EXPECT_EQ(empty->GetName(), "Filter");
-  EXPECT_EQ(empty->GetAttribute("name"), "KYR.VDP.1");
-  ASSERT_NE(empty->GetChildren(), nullptr);
-  EXPECT_EQ(empty->GetChildren()->GetName(), "UI");
-  EXPECT_EQ(empty->GetChildren()->GetNext(), nullptr);
-  EXPECT_EQ(empty->GetChildren()->GetChildren(), nullptr);
-
-  settings.GetOrInsert("ERRORPATH") = "C:\\Program Files\\Hot Folder ";
-  settings.GetOrInsert("SELECTEDDISTILLERPROFILE") = "";
-  settings.GetOrInsert("SPACES") = "  ";
-  std::unique_ptr<wxXmlNode> filter(BuildFilterElement(settings, "KYR.PDF.1"));
-  wxXmlNode* element = filter->GetChildren()->GetChildren();
-  for (const SettingsMap::Entry& entry : settings) {
-    ASSERT_NE(element, nullptr);
-    EXPECT_EQ(element->GetName(), entry.first);
-    wxXmlNode* text = element->GetChildren();
-    ASSERT_NE(text, nullptr) << entry.first;
-    EXPECT_EQ(text->GetType(), wxXML_TEXT_NODE);
-    EXPECT_EQ(text->GetContent(), entry.second);
-    EXPECT_EQ(text->GetNext(), nullptr);
-    element = element->GetNext();
-  }
-  EXPECT_EQ(element, nullptr);
-}
-
-TEST_F(RegistrationTest, NameAndPaths) {
+TEST_F(RegistrationTest, NameAndPathsAndQueue) {
   struct Case {
     const char* folder_path;
-    const char* host_dir;  // under drive D:
+    const char* dir;              // D:\Jobs\<dir>
+    const char* logical_printer;  // null: absent
     const char* name;
     const char* full_path;
-    const char* settings_dir;
+    const char* queue;
   } cases[] = {
-      {"D:\\Jobs\\Flyers.v2", "Jobs/Flyers.v2", "Flyers", "D:\\Jobs\\Flyers.v2",
-       "D:\\Jobs\\Flyers.v2\\[_KYR_HotFolder_]"},
-      {"D:\\Jobs\\Brochures\\", "Jobs/Brochures", "", "D:\\Jobs\\Brochures\\",
-       "D:\\Jobs\\Brochures\\\\[_KYR_HotFolder_]"},
-      {"D:/Jobs/Slashed", "Jobs/Slashed", "Slashed", "D:\\Jobs\\Slashed",
-       "D:\\Jobs\\Slashed\\[_KYR_HotFolder_]"},
+      {"D:\\Jobs\\Flyers.v2", "Flyers.v2", "Direct to Print", "Flyers", "D:\\Jobs\\Flyers.v2",
+       "print"},
+      {"D:\\Jobs\\Brochures\\", "Brochures", "pRiNt-dIrEcT", "", "D:\\Jobs\\Brochures\\", "print"},
+      {"D:/Jobs/Slashed", "Slashed", "xdirectx", "Slashed", "D:\\Jobs\\Slashed", "direct"},
+      {"D:\\Jobs\\Proof", "Proof", "Proof", "Proof", "D:\\Jobs\\Proof", "hold"},
+      {"D:\\Jobs\\None", "None", nullptr, "None", "D:\\Jobs\\None", "hold"},
   };
   for (const Case& c : cases) {
-    fs::path folder = prefix_.Drive('d') / c.host_dir;
-    fs::create_directories(folder / kSettingsDir);
-    engine_.m_FolderSettings.GetOrInsert("HFFolderPath") = c.folder_path;
+    engine_.ClearSettingsMaps();
+    fs::path folder = MakeFolder(c.dir, c.folder_path);
+    if (c.logical_printer) {
+      engine_.m_FolderSettings.GetOrInsert("LogicalPrinter") = c.logical_printer;
+    }
     StoredHotFolder stored = Register();
     EXPECT_EQ(stored.setting.Name, c.name);
     EXPECT_EQ(stored.setting.FolderPath, c.full_path);
+    EXPECT_EQ(stored.setting.Queue, c.queue);
+    EXPECT_EQ(stored.setting.Queue2, c.queue);
     EXPECT_EQ(stored.folderConfiguration.FolderPath, c.folder_path);
-    EXPECT_EQ(stored.folderConfiguration.WorkFolder, wxString(c.settings_dir) + "\\[WorkFolder]");
-    EXPECT_EQ(stored.folderConfiguration.FailedFolder,
-              wxString(c.settings_dir) + "\\[FailedFolder]");
-    EXPECT_EQ(stored.folderConfiguration.MoveFolder, wxString(c.settings_dir) + "\\[MoveFolder]");
+    wxString settings_dir = wxString(c.full_path) + "\\[_KYR_HotFolder_]\\";
+    EXPECT_EQ(stored.folderConfiguration.WorkFolder, settings_dir + "[WorkFolder]");
+    EXPECT_EQ(stored.folderConfiguration.FailedFolder, settings_dir + "[FailedFolder]");
+    EXPECT_EQ(stored.folderConfiguration.MoveFolder, settings_dir + "[MoveFolder]");
     EXPECT_TRUE(fs::is_directory(folder / kRetiredDir)) << c.folder_path;
-    EXPECT_FALSE(fs::exists(folder / kSettingsDir)) << c.folder_path;
-  }
-}
-
-TEST_F(RegistrationTest, QueueWord) {
-  struct Case {
-    const char* logical_printer;  // null: absent
-    const char* queue;
-  } cases[] = {
-      {"Direct to Print", "print"},
-      {"pRiNt-dIrEcT", "print"},
-      {"xdirectx", "direct"},
-      {"Proof", "hold"},
-      {"", "hold"},
-      {nullptr, "hold"},
-  };
-  int n = 0;
-  for (const Case& c : cases) {
-    engine_.ClearSettingsMaps();
-    MakeFolder("Queue" + std::to_string(n++));
-    if (c.logical_printer)
-      engine_.m_FolderSettings.GetOrInsert("LogicalPrinter") = c.logical_printer;
-    db::Setting s = Register().setting;
-    EXPECT_EQ(s.Queue, c.queue) << c.logical_printer;
-    EXPECT_EQ(s.Queue2, c.queue);
   }
 }
 
@@ -240,6 +184,12 @@ struct FakeHosts {
 } g_hosts;
 std::string g_queries;
 
+bool FakeLookup(const std::string& query, std::string* name) {
+  g_queries += query + ";";
+  if (g_hosts.remote) *name = g_hosts.remote;
+  return g_hosts.remote != nullptr;
+}
+
 const HostResolver kFakeResolver = {
     [] { return g_hosts.sockets; },
     [](std::string* name) {
@@ -247,16 +197,8 @@ const HostResolver kFakeResolver = {
       if (g_hosts.local) *name = g_hosts.local;
       return g_hosts.local != nullptr;
     },
-    [](const std::string& query, std::string* name) {
-      g_queries += "name:" + query + ";";
-      if (g_hosts.remote) *name = g_hosts.remote;
-      return g_hosts.remote != nullptr;
-    },
-    [](const std::string& query, std::string* name) {
-      g_queries += "addr:" + query + ";";
-      if (g_hosts.remote) *name = g_hosts.remote;
-      return g_hosts.remote != nullptr;
-    },
+    [](const std::string& query, std::string* name) { return FakeLookup("name:" + query, name); },
+    [](const std::string& query, std::string* name) { return FakeLookup("addr:" + query, name); },
 };
 
 TEST(ResolveServerNameTest, DispatchAndShortName) {
@@ -291,40 +233,36 @@ TEST(ResolveServerNameTest, DispatchAndShortName) {
   }
 }
 
-TEST_F(RegistrationTest, ServerFromTheSystemResolver) {
+TEST_F(RegistrationTest, ServerAndJobConfiguration) {
   std::string local;
-  if (!platform::LocalHostName(&local)) GTEST_SKIP() << "no local host name";
+  bool have_local = LocalHostName(&local);
   MakeFolder("Local");
   engine_.m_FolderSettings.GetOrInsert("ServerAddr") = "LOCALHOST";
   engine_.m_FolderSettings.GetOrInsert("ServerName") = "legacy";
-  db::Setting s = Register().setting;
-  EXPECT_EQ(s.ServerAddr, "LOCALHOST");
-  EXPECT_EQ(s.ServerName, wxString(local));
-
-  MakeFolder("Nowhere");
-  engine_.m_FolderSettings.GetOrInsert("ServerAddr") = "300.1.2.3";
-  s = Register().setting;
-  EXPECT_EQ(s.ServerAddr, "300.1.2.3");
-  EXPECT_EQ(s.ServerName, "legacy");
-}
-
-TEST_F(RegistrationTest, DriverSettingsBecomeTheJobConfiguration) {
-  MakeFolder("Job");
   for (const char* key : {"numCOPIES", "Duplex", "alpha", "num copies", "NumCopies"}) {
     engine_.m_DriverSettings.GetOrInsert(key) = wxString("v-") + key;
   }
-  db::JobConfiguration job = Register().jobConfiguration;
+  StoredHotFolder stored = Register();
+  EXPECT_EQ(stored.setting.ServerAddr, "LOCALHOST");
+  if (have_local) {
+    EXPECT_EQ(stored.setting.ServerName, wxString(local));
+  }
   std::vector<std::vector<wxString>> rows;
-  for (const auto& [key, e] : job) rows.push_back({key, e.Name, e.Value, e.Extra});
+  for (const auto& [key, e] : stored.jobConfiguration) {
+    rows.push_back({key, e.Name, e.Value, e.Extra});
+  }
   EXPECT_EQ(rows, (std::vector<std::vector<wxString>>{
                       {"Duplex", "Duplex", "v-Duplex", ""},
                       {"alpha", "alpha", "v-alpha", ""},
                       {"num copies", "numCOPIES", "v-numCOPIES", ""},
                   }));
+
+  MakeFolder("Nowhere");
+  engine_.m_FolderSettings.GetOrInsert("ServerAddr") = "300.1.2.3";
+  EXPECT_EQ(Register().setting.ServerName, "legacy");
 }
 
 TEST_F(RegistrationTest, RetiringTheSettingsDirectory) {
-  using namespace platform;
   struct Case {
     bool retired_exists;
     std::uint32_t before;
@@ -344,43 +282,39 @@ TEST_F(RegistrationTest, RetiringTheSettingsDirectory) {
     if (c.retired_exists) fs::create_directory(folder / kRetiredDir);
     ASSERT_TRUE(SetFileAttributes(wxString(windows + kSettingsDir).ToStdWstring(), c.before));
     Register();
-    const char* now = c.retired_exists ? kSettingsDir : kRetiredDir;
     EXPECT_EQ(fs::exists(folder / kSettingsDir), c.retired_exists) << name;
-    EXPECT_EQ(Attributes(folder / now, windows + now), c.after) << name;
+    EXPECT_EQ(AttributesOf(windows + (c.retired_exists ? kSettingsDir : kRetiredDir)), c.after);
   }
 }
 
-TEST_F(RegistrationTest, DisabledFolderIsDisabledInTheStore) {
-  MakeFolder("On");
-  EXPECT_TRUE(Register().enabled);
+TEST_F(RegistrationTest, StoreAnswers) {
+  // An unreadable store refuses: the directory comes back with its attributes.
+  fs::path store(StoreHostPath());
+  prefix_.WriteFile(store, std::string(4096, 'x'));
+  fs::path folder = MakeFolder("Corrupt");
+  const std::uint32_t attributes = kAttributeReadOnly | kAttributeSystem;
+  ASSERT_TRUE(SetFileAttributes(L"D:\\Jobs\\Corrupt\\[_KYR_HotFolder_]", attributes));
+  engine_.m_ImpositionProperties.GetOrInsert("Template") = "ImposeTemplate.2";
+  EXPECT_FALSE(engine_.RegisterHotFolder());
+  EXPECT_TRUE(engine_.m_ImpositionProperties.Empty());
+  EXPECT_FALSE(fs::exists(folder / kRetiredDir));
+  EXPECT_EQ(AttributesOf("D:\\Jobs\\Corrupt\\[_KYR_HotFolder_]"), attributes);
+  fs::remove(store);
+
   MakeFolder("Off");
   engine_.m_CurrentEnabled = false;
   EXPECT_FALSE(Register().enabled);
-}
 
-TEST_F(RegistrationTest, RefusedFolderGetsItsSettingsBack) {
-  // Already registered: the store keeps the first registration, enabled.
-  fs::path folder = MakeFolder("Twice");
-  Register();
+  // Already registered: refused, and the stored folder is not disabled.
+  engine_.m_CurrentEnabled = true;
+  folder = MakeFolder("Twice");
+  EXPECT_TRUE(Register().enabled);
   fs::rename(folder / kRetiredDir, folder / kSettingsDir);
   engine_.m_CurrentEnabled = false;
   engine_.m_DriverSettings.GetOrInsert("Duplex") = "On";
   EXPECT_TRUE(Register(false).enabled);
   EXPECT_TRUE(fs::is_directory(folder / kSettingsDir));
   EXPECT_FALSE(fs::exists(folder / kRetiredDir));
-
-  // An unreadable store: the directory comes back with its attributes.
-  fs::path store(StoreHostPath());
-  fs::remove(store);
-  prefix_.WriteFile(store, std::string(4096, 'x'));
-  folder = MakeFolder("Corrupt");
-  const std::uint32_t attributes = platform::kAttributeReadOnly | platform::kAttributeSystem;
-  ASSERT_TRUE(platform::SetFileAttributes(L"D:\\Jobs\\Corrupt\\[_KYR_HotFolder_]", attributes));
-  engine_.m_ImpositionProperties.GetOrInsert("Template") = "ImposeTemplate.2";
-  EXPECT_FALSE(engine_.RegisterHotFolder());
-  EXPECT_TRUE(engine_.m_ImpositionProperties.Empty());
-  EXPECT_FALSE(fs::exists(folder / kRetiredDir));
-  EXPECT_EQ(Attributes(folder / kSettingsDir, "D:\\Jobs\\Corrupt\\[_KYR_HotFolder_]"), attributes);
 }
 
 // Any hotfolder.exe of this host, whoever started it.
@@ -416,10 +350,9 @@ TEST(ServerDirectoryTest, DirectoryOfTheRunningServer) {
   kill(pid, SIGKILL);
   waitpid(pid, nullptr, 0);
 
-  wxString expected(platform::FromHostPath(fs::canonical(bin).string()));
+  wxString expected(FromHostPath(fs::canonical(bin).string()));
   EXPECT_EQ(directory, expected);
-  ASSERT_TRUE(engine.m_PexFilterConv.Contains("ERRORPATH"));
-  EXPECT_EQ(*engine.m_PexFilterConv.Find("ERRORPATH"), expected);
+  EXPECT_EQ(engine.m_PexFilterConv.GetOrInsert("ERRORPATH"), expected);
 }
 
 }  // namespace
