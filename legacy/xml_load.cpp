@@ -4,24 +4,41 @@
 #include <wx/log.h>
 #include <wx/mstream.h>
 
+#include <cstring>
 #include <fstream>
 
 #include "platform/platform.h"
 
 namespace {
 
-struct DepthCheck {
+// What wx would build from the document, measured as it streams past.
+// Content counts after entity expansion, so a small file that expands into
+// a huge tree is refused like a huge file.
+struct Measure {
   XML_Parser parser;
   int depth = 0;
+  std::size_t content = 0;
 };
 
-void XMLCALL OnStart(void* data, const XML_Char*, const XML_Char**) {
-  DepthCheck* check = static_cast<DepthCheck*>(data);
-  if (++check->depth > kMaxConfigDepth) XML_StopParser(check->parser, XML_FALSE);
+void Charge(Measure* measure, std::size_t bytes) {
+  measure->content += bytes;
+  if (measure->content > kMaxConfigBytes) XML_StopParser(measure->parser, XML_FALSE);
+}
+
+void XMLCALL OnStart(void* data, const XML_Char* name, const XML_Char** attributes) {
+  Measure* measure = static_cast<Measure*>(data);
+  std::size_t bytes = std::strlen(name) + 2;
+  for (; *attributes; ++attributes) bytes += std::strlen(*attributes) + 1;
+  Charge(measure, bytes);
+  if (++measure->depth > kMaxConfigDepth) XML_StopParser(measure->parser, XML_FALSE);
 }
 
 void XMLCALL OnEnd(void* data, const XML_Char*) {
-  --static_cast<DepthCheck*>(data)->depth;
+  --static_cast<Measure*>(data)->depth;
+}
+
+void XMLCALL OnText(void* data, const XML_Char*, int length) {
+  Charge(static_cast<Measure*>(data), static_cast<std::size_t>(length));
 }
 
 // wx reads a declared single-byte encoding that expat does not know through
@@ -35,15 +52,16 @@ int XMLCALL OnUnknownEncoding(void*, const XML_Char*, XML_Encoding* info) {
   return XML_STATUS_OK;
 }
 
-// Reads at most kMaxConfigBytes; one byte more means the file is too large.
+// Reads the file, refusing it once it holds more than kMaxConfigBytes.
 bool ReadBounded(const platform::HostPath& path, std::string* bytes) {
   std::ifstream in(path, std::ios::binary);
   if (!in) return false;
-  bytes->resize(kMaxConfigBytes + 1);
-  in.read(bytes->data(), static_cast<std::streamsize>(bytes->size()));
-  if (in.bad()) return false;
-  bytes->resize(static_cast<std::size_t>(in.gcount()));
-  return bytes->size() <= kMaxConfigBytes;
+  char chunk[64 * 1024];
+  while (in.read(chunk, sizeof(chunk)) || in.gcount() > 0) {
+    bytes->append(chunk, static_cast<std::size_t>(in.gcount()));
+    if (bytes->size() > kMaxConfigBytes) return false;
+  }
+  return !in.bad();
 }
 
 }  // namespace
@@ -51,9 +69,10 @@ bool ReadBounded(const platform::HostPath& path, std::string* bytes) {
 bool XmlWithinBounds(const std::string& bytes) {
   XML_Parser parser = XML_ParserCreate(nullptr);
   if (!parser) return false;
-  DepthCheck check{parser};
-  XML_SetUserData(parser, &check);
+  Measure measure{parser};
+  XML_SetUserData(parser, &measure);
   XML_SetElementHandler(parser, OnStart, OnEnd);
+  XML_SetCharacterDataHandler(parser, OnText);
   XML_SetUnknownEncodingHandler(parser, OnUnknownEncoding, nullptr);
   XML_Status status = XML_Parse(parser, bytes.data(), static_cast<int>(bytes.size()), XML_TRUE);
   XML_ParserFree(parser);

@@ -16,13 +16,15 @@
 constexpr std::size_t kMaxConfigBytes = 64u << 20;
 constexpr int kMaxConfigDepth = 256;
 
-// True when the document's elements nest no deeper than kMaxConfigDepth and
-// the bytes are well-formed XML.
+// True when the bytes are well-formed XML whose elements nest no deeper than
+// kMaxConfigDepth and whose content, entities expanded, stays within
+// kMaxConfigBytes.
 bool XmlWithinBounds(const std::string& bytes);
 
 // Loads the file at a Windows path into `doc`, encoding "UTF-8", dropping
 // text nodes that hold only white space. False, with nothing logged, when
-// the file cannot be read, is too large or too deep, or has no root element.
+// the file cannot be read, is too large (before or after entity expansion)
+// or too deep, or has no root element.
 bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc);
 
 #endif  // HF_LEGACY_XML_LOAD_H_
