@@ -5,6 +5,7 @@
 
 #include <wx/string.h>
 
+#include <string>
 #include <vector>
 
 #include "platform/platform.h"
@@ -19,6 +20,9 @@ struct StoredHotFolder {
   db::ImposeConfiguration imposeConfiguration;
   db::PreflightConfiguration preflightConfiguration;
 };
+
+// The folder of the store at its fixed location, as a Windows path.
+std::wstring StoreFolder();
 
 // The host path of the store at its fixed location.
 platform::HostPath StoreHostPath();

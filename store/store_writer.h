@@ -1,0 +1,64 @@
+// The writing side of the store: one connection with its prepared
+// statements, kept open across calls because every registration already
+// costs a durable commit and should cost nothing more.
+#ifndef HF_STORE_STORE_WRITER_H_
+#define HF_STORE_STORE_WRITER_H_
+
+#include <memory>
+#include <string>
+
+#include "platform/platform.h"
+#include "store/records.h"
+#include "store/sqlite_statement.h"
+
+namespace db {
+
+// The six records of one hot folder, as handed to the store.
+struct HotFolderRecords {
+  const Setting& setting;
+  const FolderConfiguration& folder;
+  const JobConfiguration& job;
+  const FilterConfiguration& filter;
+  const ImposeConfiguration& impose;
+  const PreflightConfiguration& preflight;
+};
+
+// Where the database lives: its folder as a Windows path (created on first
+// use) and the file as the host names it.
+struct StoreLocation {
+  std::wstring folder;
+  platform::HostPath file;
+};
+
+enum class CreateResult { kCreated, kAlreadyRegistered, kFailed };
+
+class StoreWriter {
+ public:
+  StoreWriter();
+  ~StoreWriter();
+
+  // Both calls (re)open the database at `file` when it is not the one open,
+  // or when the last call failed. A failure closes the connection so that
+  // the next call starts afresh.
+  CreateResult Create(const StoreLocation& location, const HotFolderRecords& records);
+  // False for an unknown folder path as well as for a failure. A missing
+  // database holds no folder, so it is not created for this.
+  bool Disable(const StoreLocation& location, const wxString& folder_path);
+
+ private:
+  struct Statements;
+
+  bool EnsureOpen(const StoreLocation& location, bool create);
+  bool Open(const StoreLocation& location, bool create);
+  bool Insert(const HotFolderRecords& records, bool* duplicate);
+  bool InsertRecords(const HotFolderRecords& records, bool* duplicate);
+  void Close();
+
+  platform::HostPath file_;
+  Database db_;
+  std::unique_ptr<Statements> statements_;
+};
+
+}  // namespace db
+
+#endif  // HF_STORE_STORE_WRITER_H_
