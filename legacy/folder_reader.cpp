@@ -83,7 +83,7 @@ const wxXmlNode* NthChild(const wxXmlNode* node, int n) {
 // A container's enable text is the text inside its third child. False when
 // the container is too small to hold one.
 bool ContainerEnableText(const wxXmlNode* container, wxString* text) {
-  const wxXmlNode* third = NthChild(container, 2);
+  const wxXmlNode* third = container ? NthChild(container, 2) : nullptr;
   const wxXmlNode* holder = third ? NthChild(third, 0) : nullptr;
   if (!holder) return false;
   *text = holder->GetContent();

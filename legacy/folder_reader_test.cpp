@@ -128,9 +128,9 @@ TEST_F(FolderReaderTest, SectionsAndFilterIdentifiers) {
       {"XRX bare with trailing space", Doc(Container(kXrxBare + "\n   ", "1")), kEnable,
        "XRX=1;MICROSOFT=0;"},
       {"XRX bare in braces", Doc(Container("{" + kXrxBare + "}\n", "1")), kEnable, "MICROSOFT=0;"},
-      {"comments do not count",
+      {"comments and blank text do not count",
        Doc("<FILTERID><!--by hand-->" + kPdf2Ps +
-           "<?pi x?><Name/><!--x--><Enabled><!--c-->1</Enabled></FILTERID>"),
+           "<?pi x?>\n  <Name/>\n  <!--x--><Enabled><!--c-->1</Enabled></FILTERID>"),
        kEnable, "PDF2PS=1;MICROSOFT=0;"},
       {"small containers skipped",
        Doc("<FILTERID/><FILTERID>" + kPdf2Ps + "<Name/></FILTERID>" + Container(kXrx, "1")),
