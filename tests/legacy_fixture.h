@@ -1,0 +1,55 @@
+// Writing legacy installations into a temporary prefix: the binary list file
+// and folder.cfg files.
+#ifndef HF_TESTS_LEGACY_FIXTURE_H_
+#define HF_TESTS_LEGACY_FIXTURE_H_
+
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "tests/temp_prefix.h"
+
+struct LegacyFolder {
+  std::string path;       // Windows path as stored, in Windows-1252 bytes
+  std::uint16_t state;    // 2 = enabled
+};
+
+// The list file's bytes: the 40-byte header, then one 264-byte record each.
+inline std::string LegacyListBytes(const std::vector<LegacyFolder>& folders) {
+  std::string bytes("KYR ZerOvurova Database", 23);
+  bytes.append(1, '\0');
+  bytes.append(1, '\x01');
+  bytes.append(15, '\0');
+  for (const LegacyFolder& folder : folders) {
+    std::string record(264, '\0');
+    record[2] = static_cast<char>(folder.state & 0xFF);
+    record[3] = static_cast<char>(folder.state >> 8);
+    record.replace(4, folder.path.size(), folder.path);
+    bytes += record;
+  }
+  return bytes;
+}
+
+inline std::filesystem::path LegacyListHostPath(const TempPrefix& prefix) {
+  return prefix.Drive('c') / "ProgramData" / "KYR" / "ZerOvurova" /
+         "KYR ZerOvurova Preferences" / "KYR ZerOvurova DB";
+}
+
+inline void WriteLegacyList(const TempPrefix& prefix, const std::vector<LegacyFolder>& folders) {
+  prefix.WriteFile(LegacyListHostPath(prefix), LegacyListBytes(folders));
+}
+
+// Host path of D:\<relative> (relative with forward slashes).
+inline std::filesystem::path OnDriveD(const TempPrefix& prefix, const std::string& relative) {
+  return prefix.Drive('d') / relative;
+}
+
+// Writes <folder>/[_KYR_HotFolder_]/folder.cfg for a folder on drive D:.
+inline void WriteFolderConfig(const TempPrefix& prefix, const std::string& folder_on_d,
+                              const std::string& xml) {
+  prefix.WriteFile(OnDriveD(prefix, folder_on_d) / "[_KYR_HotFolder_]" / "folder.cfg", xml);
+}
+
+#endif  // HF_TESTS_LEGACY_FIXTURE_H_
