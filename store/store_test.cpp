@@ -212,6 +212,16 @@ TEST(Store, RegisteredPathIsNeverOverwrittenAndDisableFindsIt) {
   EXPECT_EQ(dump, json::parse(before));
 }
 
+TEST(Store, StoreRemovedWhileOpenIsStartedAfresh) {
+  TempPrefix prefix;
+  Folder first("D:\\Jobs\\A");
+  ASSERT_NE(first.Create(), 0);
+  fs::remove_all(prefix.Drive('c') / "ProgramData");
+  Folder second("D:\\Jobs\\B");
+  ASSERT_NE(second.Create(), 0);
+  EXPECT_EQ(RunHfstore(prefix, {"list"}).out, "enabled\t\tD:\\Jobs\\B\t\n");
+}
+
 TEST(Store, KeysOrderByUtf16CodeUnits) {
   struct Case {
     const char* a;

@@ -1,5 +1,9 @@
 #include "store/store_writer.h"
 
+#ifndef _WIN32
+#include <sys/stat.h>
+#endif
+
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -116,10 +120,28 @@ void StoreWriter::Close() {
   file_.clear();
 }
 
+bool StoreWriter::Identify(const platform::HostPath& file, FileId* id) {
+#ifdef _WIN32
+  // Windows deletes or replaces no file that SQLite holds open.
+  (void)file;
+  *id = FileId();
+  return true;
+#else
+  struct stat st;
+  if (stat(file.c_str(), &st) != 0) return false;
+  id->device = static_cast<std::uint64_t>(st.st_dev);
+  id->inode = static_cast<std::uint64_t>(st.st_ino);
+  return true;
+#endif
+}
+
 bool StoreWriter::EnsureOpen(const StoreLocation& location, bool create) {
-  if (db_ && location.file == file_) return true;
+  // A store deleted or replaced while open would take commits into a file
+  // nobody will read again, and answer success for them.
+  FileId id;
+  if (db_ && location.file == file_ && Identify(file_, &id) && id == file_id_) return true;
   Close();
-  if (location.file.empty() || !Open(location, create)) {
+  if (location.file.empty() || !Open(location, create) || !Identify(location.file, &file_id_)) {
     Close();
     return false;
   }

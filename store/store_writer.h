@@ -4,6 +4,7 @@
 #ifndef HF_STORE_STORE_WRITER_H_
 #define HF_STORE_STORE_WRITER_H_
 
+#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -54,7 +55,19 @@ class StoreWriter {
   bool InsertRecords(const HotFolderRecords& records, bool* duplicate);
   void Close();
 
+  // Which file is open: the path, and the file's identity on hosts where
+  // an open file can be deleted or replaced under the same name.
+  struct FileId {
+    std::uint64_t device = 0;
+    std::uint64_t inode = 0;
+    bool operator==(const FileId& other) const {
+      return device == other.device && inode == other.inode;
+    }
+  };
+  static bool Identify(const platform::HostPath& file, FileId* id);
+
   platform::HostPath file_;
+  FileId file_id_;
   Database db_;
   std::unique_ptr<Statements> statements_;
 };
