@@ -1,0 +1,276 @@
+// The platform layer on Windows: every service is the Win32 call the system
+// was built around, so paths need no mapping and names are passed through as
+// they are. Each handle this file opens is closed before the call returns,
+// except the one mutex a process asks to hold for its whole life.
+#include "platform/platform.h"
+
+// winsock2.h must come before windows.h, which would pull in the old winsock.
+#include <winsock2.h>
+
+#include <windows.h>
+
+#include <knownfolders.h>
+#include <psapi.h>
+#include <shlobj.h>
+#include <shlwapi.h>
+
+#include <cwchar>
+
+// windows.h turns these into macros for its A/W variants; the interface's own
+// functions of the same name must keep their names.
+#undef GetFileAttributes
+#undef SetFileAttributes
+
+namespace platform {
+namespace {
+
+// All access rights of a mutex object: the probe must see exactly the mutex
+// the server holds, with the rights the tool would need to use it.
+constexpr DWORD kMutexAllAccess = 0x1F0001;
+
+// Query information (0x400) + read process memory (0x10) + terminate (0x1):
+// reading another process's module list needs the first two, stopping the
+// server the third.
+constexpr DWORD kProcessRights = 0x411;
+
+// Module names are read into buffers of the classic path length.
+constexpr DWORD kNameLength = 260;
+
+// Closes a handle when the scope ends, so that no early return leaks one.
+class ScopedHandle {
+ public:
+  explicit ScopedHandle(HANDLE handle) : handle_(handle) {}
+  ~ScopedHandle() {
+    if (handle_ != nullptr) CloseHandle(handle_);
+  }
+  ScopedHandle(const ScopedHandle&) = delete;
+  ScopedHandle& operator=(const ScopedHandle&) = delete;
+  HANDLE get() const { return handle_; }
+
+ private:
+  HANDLE handle_;
+};
+
+bool IsSeparator(wchar_t c) {
+  return c == L'\\' || c == L'/';
+}
+
+// Length of the part of a path that names a root and cannot be created:
+// "X:\" or "\\server\share\". Zero for a relative path.
+std::size_t RootLength(const std::wstring& path) {
+  if (path.size() >= 2 && path[1] == L':') {
+    return path.size() >= 3 && IsSeparator(path[2]) ? 3 : 2;
+  }
+  if (path.size() >= 2 && IsSeparator(path[0]) && IsSeparator(path[1])) {
+    std::size_t separators = 0;
+    for (std::size_t i = 2; i < path.size(); ++i) {
+      if (IsSeparator(path[i]) && ++separators == 2) return i + 1;
+    }
+    return path.size();
+  }
+  return IsSeparator(path.empty() ? L'x' : path[0]) ? 1 : 0;
+}
+
+}  // namespace
+
+// ---- Paths ------------------------------------------------------------------
+
+HostPath ToHostPath(const std::wstring& windows_path) {
+  return windows_path;
+}
+
+std::wstring FromHostPath(const HostPath& host_path) {
+  return host_path;
+}
+
+std::wstring CommonAppDataFolder() {
+  PWSTR folder = nullptr;
+  std::wstring result;
+  if (SUCCEEDED(SHGetKnownFolderPath(FOLDERID_ProgramData, 0, nullptr, &folder))) {
+    result = folder;
+  }
+  // The shell allocates the text even for some failures; it is ours to free.
+  CoTaskMemFree(folder);
+  return result;
+}
+
+bool RemoveFileSpec(std::wstring* path) {
+  std::wstring buffer = *path;
+  buffer.push_back(L'\0');
+  if (!PathRemoveFileSpecW(&buffer[0])) return false;
+  path->assign(buffer.c_str());
+  return true;
+}
+
+// ---- Files ------------------------------------------------------------------
+
+bool FileExists(const std::wstring& windows_path) {
+  DWORD attributes = GetFileAttributesW(windows_path.c_str());
+  return attributes != INVALID_FILE_ATTRIBUTES && !(attributes & FILE_ATTRIBUTE_DIRECTORY);
+}
+
+bool DirectoryExists(const std::wstring& windows_path) {
+  DWORD attributes = GetFileAttributesW(windows_path.c_str());
+  return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY);
+}
+
+bool CreateDirectories(const std::wstring& windows_path) {
+  if (windows_path.empty()) return false;
+  // Each parent in turn; one that exists already answers an error that the
+  // final test makes irrelevant.
+  for (std::size_t i = RootLength(windows_path); i < windows_path.size(); ++i) {
+    if (IsSeparator(windows_path[i])) CreateDirectoryW(windows_path.substr(0, i).c_str(), nullptr);
+  }
+  CreateDirectoryW(windows_path.c_str(), nullptr);
+  return DirectoryExists(windows_path);
+}
+
+// The bits come back as the OS reports them, those without a kAttribute*
+// name included, so that writing them back after clearing one keeps the rest.
+bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes) {
+  DWORD bits = GetFileAttributesW(windows_path.c_str());
+  if (bits == INVALID_FILE_ATTRIBUTES) return false;
+  *attributes = bits;
+  return true;
+}
+
+bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes) {
+  DWORD bits = attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_DIRECTORY);
+  // Zero would ask the file system to leave the attributes as they are; NORMAL
+  // is how Windows spells "none of them".
+  if (bits == 0) bits = FILE_ATTRIBUTE_NORMAL;
+  return SetFileAttributesW(windows_path.c_str(), bits) != 0;
+}
+
+bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
+  // Without MOVEFILE_REPLACE_EXISTING an existing target makes the move fail.
+  return MoveFileW(from.c_str(), to.c_str()) != 0;
+}
+
+// ---- Named mutex ------------------------------------------------------------
+
+bool NamedMutexExists(const std::wstring& name) {
+  ScopedHandle mutex(OpenMutexW(kMutexAllAccess, FALSE, name.c_str()));
+  return mutex.get() != nullptr;
+}
+
+bool HoldNamedMutex(const std::wstring& name) {
+  HANDLE mutex = CreateMutexW(nullptr, TRUE, name.c_str());
+  if (mutex == nullptr) return false;
+  if (GetLastError() == ERROR_ALREADY_EXISTS) {
+    CloseHandle(mutex);
+    return false;
+  }
+  // Deliberately left open: the mutex exists exactly as long as this process,
+  // and the system closes the handle when the process ends however it ends.
+  return true;
+}
+
+// ---- Processes --------------------------------------------------------------
+
+bool LaunchDetached(const std::wstring& file_name) {
+  // The name is quoted so that spaces stay part of it; a quote inside it could
+  // only end the name early and run something else.
+  if (file_name.empty() || file_name.find(L'"') != std::wstring::npos) return false;
+  // CreateProcessW may write into the command line, so it gets its own copy.
+  std::wstring command_line = L"\"" + file_name + L"\"";
+  STARTUPINFOW startup = {};
+  startup.cb = sizeof(startup);
+  PROCESS_INFORMATION process = {};
+  // No application name: the command line's first token is found by the
+  // system's executable search, as a bare name typed at a prompt would be.
+  if (!CreateProcessW(nullptr, &command_line[0], nullptr, nullptr, FALSE, CREATE_NO_WINDOW, nullptr,
+                      nullptr, &startup, &process)) {
+    return false;
+  }
+  CloseHandle(process.hThread);
+  CloseHandle(process.hProcess);
+  return true;
+}
+
+bool EnumerateProcesses(std::vector<ProcessId>* ids) {
+  std::vector<DWORD> table(kMaxProcesses, 0);
+  DWORD bytes = 0;
+  if (!K32EnumProcesses(table.data(), static_cast<DWORD>(table.size() * sizeof(DWORD)), &bytes)) {
+    return false;
+  }
+  std::size_t count = bytes / sizeof(DWORD);
+  if (count > kMaxProcesses) count = kMaxProcesses;
+  ids->assign(table.begin(), table.begin() + count);
+  return true;
+}
+
+bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* file_name) {
+  ScopedHandle process(OpenProcess(kProcessRights, FALSE, id));
+  if (process.get() == nullptr) return false;
+  // Room for one module: the first one listed is the executable.
+  HMODULE module = nullptr;
+  DWORD needed = 0;
+  if (!K32EnumProcessModules(process.get(), &module, sizeof(module), &needed)) return false;
+  // A fresh buffer per process: a failed read never yields a name left over
+  // from the process before.
+  wchar_t name[kNameLength] = {};
+  DWORD length = K32GetModuleBaseNameW(process.get(), module, name, kNameLength);
+  if (length == 0) return false;
+  if (file_name != nullptr) {
+    wchar_t path[kNameLength] = {};
+    DWORD path_length = K32GetModuleFileNameExW(process.get(), module, path, kNameLength);
+    if (path_length == 0) return false;
+    file_name->assign(path, path_length);
+  }
+  base_name->assign(name, length);
+  return true;
+}
+
+bool TerminateProcess(ProcessId id) {
+  ScopedHandle process(OpenProcess(kProcessRights, FALSE, id));
+  if (process.get() == nullptr) return false;
+  return ::TerminateProcess(process.get(), 0) != 0;
+}
+
+// ---- Registry ---------------------------------------------------------------
+
+bool HklmKeyOpensForRead(const std::wstring& key) {
+  HKEY opened = nullptr;
+  if (RegOpenKeyExW(HKEY_LOCAL_MACHINE, key.c_str(), 0, KEY_READ, &opened) != ERROR_SUCCESS) {
+    return false;
+  }
+  RegCloseKey(opened);
+  return true;
+}
+
+// ---- Network ----------------------------------------------------------------
+
+bool StartSockets() {
+  WSADATA data;
+  return WSAStartup(MAKEWORD(2, 2), &data) == 0;
+}
+
+bool LocalHostName(std::string* name) {
+  char buffer[128] = {};
+  if (gethostname(buffer, sizeof(buffer)) != 0) return false;
+  buffer[sizeof(buffer) - 1] = '\0';
+  *name = buffer;
+  return true;
+}
+
+bool HostByName(const std::string& name, std::string* official_name) {
+  // A name with a NUL in it would be looked up as its first part only.
+  if (name.find('\0') != std::string::npos) return false;
+  const hostent* host = gethostbyname(name.c_str());
+  if (host == nullptr || host->h_name == nullptr) return false;
+  *official_name = host->h_name;
+  return true;
+}
+
+bool HostByIPv4Address(const std::string& dotted, std::string* official_name) {
+  if (dotted.find('\0') != std::string::npos) return false;
+  unsigned long address = inet_addr(dotted.c_str());
+  if (address == INADDR_NONE) return false;
+  const hostent* host = gethostbyaddr(reinterpret_cast<const char*>(&address), 4, AF_INET);
+  if (host == nullptr || host->h_name == nullptr) return false;
+  *official_name = host->h_name;
+  return true;
+}
+
+}  // namespace platform
