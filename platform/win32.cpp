@@ -14,7 +14,8 @@
 #include <shlobj.h>
 #include <shlwapi.h>
 
-#include <cwchar>
+#include <mutex>
+#include <set>
 
 // windows.h turns these into macros for its A/W variants; the interface's own
 // functions of the same name must keep their names.
@@ -150,11 +151,21 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
 // ---- Named mutex ------------------------------------------------------------
 
 bool NamedMutexExists(const std::wstring& name) {
+  // An empty name would open nothing named; it is no mutex.
+  if (name.empty()) return false;
   ScopedHandle mutex(OpenMutexW(kMutexAllAccess, FALSE, name.c_str()));
   return mutex.get() != nullptr;
 }
 
 bool HoldNamedMutex(const std::wstring& name) {
+  // An empty name would create an unnamed mutex that no one else can see.
+  if (name.empty()) return false;
+  // Asking again for a mutex this process holds answers yes without a second
+  // handle; the system could not tell that case from another holder.
+  static std::mutex guard;
+  static std::set<std::wstring> held;
+  std::lock_guard<std::mutex> lock(guard);
+  if (held.count(name) != 0) return true;
   HANDLE mutex = CreateMutexW(nullptr, TRUE, name.c_str());
   if (mutex == nullptr) return false;
   if (GetLastError() == ERROR_ALREADY_EXISTS) {
@@ -163,6 +174,7 @@ bool HoldNamedMutex(const std::wstring& name) {
   }
   // Deliberately left open: the mutex exists exactly as long as this process,
   // and the system closes the handle when the process ends however it ends.
+  held.insert(name);
   return true;
 }
 
