@@ -26,15 +26,17 @@ bool Statement::Prepare(sqlite3* db, const std::string& sql) {
 }
 
 bool Statement::BindText(int index, const wxString& text) {
-  // The explicit length keeps an embedded NUL character.
+  // The explicit length keeps an embedded NUL character. A string with no
+  // UTF-8 form converts to nothing; storing that would lose the value.
   wxScopedCharBuffer utf8 = text.utf8_str();
-  return sqlite3_bind_text(stmt_, index, utf8.data(), static_cast<int>(utf8.length()),
-                           SQLITE_TRANSIENT) == SQLITE_OK;
+  if (utf8.length() == 0 && !text.empty()) return false;
+  return sqlite3_bind_text64(stmt_, index, utf8.data(), utf8.length(), SQLITE_TRANSIENT,
+                             SQLITE_UTF8) == SQLITE_OK;
 }
 
 bool Statement::BindUtf8(int index, const std::string& utf8) {
-  return sqlite3_bind_text(stmt_, index, utf8.data(), static_cast<int>(utf8.size()),
-                           SQLITE_TRANSIENT) == SQLITE_OK;
+  return sqlite3_bind_text64(stmt_, index, utf8.data(), utf8.size(), SQLITE_TRANSIENT,
+                             SQLITE_UTF8) == SQLITE_OK;
 }
 
 bool Statement::BindInt(int index, std::int64_t value) {

@@ -143,6 +143,7 @@ TEST(Store, EveryMemberSurvivesCreateAndDump) {
   s.Filters = {{"1-Bit TIFF", "KYR.ONEBITTIFF.1"}, {"PDF", "KYR.PDF.1"}, {"PDF", "KYR.PDF.1"}};
   s.Flag4 = false;
   s.String3 = "10";
+  s.String4 = wxString("a\0b", 3);
   s.String9 = W("ｚ");
   odd.folder = {"F", "", W("M 😀"), " D "};
   for (const char* key : {"\xEF\xBC\x81", "\xF0\x9F\x98\x80", "a", "Z", ""}) {
@@ -174,7 +175,7 @@ TEST(Store, EveryMemberSurvivesCreateAndDump) {
                    {"DisplayName": "PDF", "Identifier": "KYR.PDF.1"},
                    {"DisplayName": "PDF", "Identifier": "KYR.PDF.1"}],
        "Flag2": false, "Flag3": true, "Flag4": false, "String3": "10",
-       "FolderPath": " D:\\Jobs\\Brochüre 😀 ", "String4": "", "String5": "", "String6": "",
+       "FolderPath": " D:\\Jobs\\Brochüre 😀 ", "String4": "a\u0000b", "String5": "", "String6": "",
        "String7": "", "String8": "", "Flag5": true, "Flag6": false, "String9": "ｚ"},
      "folderConfiguration": {"FailedFolder": "F", "WorkFolder": "", "MoveFolder": "M 😀",
        "FolderPath": " D "},
