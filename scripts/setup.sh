@@ -4,7 +4,7 @@
 set -euo pipefail
 
 packages=(
-  cmake make g++ pkg-config
+  cmake make g++ pkg-config clang-14 libclang-rt-14-dev
   libwxgtk3.2-dev libsqlite3-dev nlohmann-json3-dev
   libgtest-dev libgmock-dev
 )

@@ -1,0 +1,165 @@
+// One listed folder, whatever bytes its folder.cfg holds, through reading,
+// conversion, registration and the real store. Settings directories that
+// accumulated over years, some damaged, must neither crash the tool nor
+// lose a folder's settings: they end up either registered and retired, or
+// refused and back where a later run finds them.
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <system_error>
+#include <vector>
+
+#include <wx/log.h>
+#include <wx/sstream.h>
+#include <wx/xml/xml.h>
+
+#include "app/migrator.h"
+#include "fuzz/fuzz_support.h"
+#include "store/store.h"
+#include "store/store_reader.h"
+#include "tests/legacy_fixture.h"
+#include "tests/temp_prefix.h"
+
+namespace {
+
+const char kFolder[] = "D:\\Jobs\\Fuzz";
+const char kFolderOnD[] = "drive_d/Jobs/Fuzz";
+const char kSettingsDir[] = "[_KYR_HotFolder_]";
+const char kRetiredDir[] = "[_KYR_HotFolder_Old]";
+const char kStoreDir[] = "drive_c/ProgramData/KYR/Dirorodiv";
+
+// One prefix for the whole process: the C library keeps every distinct
+// WINEPREFIX value it was ever given, so a prefix per input would grow the
+// process with every run (and set off the leak check after each one).
+const TempPrefix& Prefix() {
+  static TempPrefix prefix;
+  return prefix;
+}
+
+// The installation as the legacy service left it, the folder under test
+// with a job waiting in it and a spool file beside folder.cfg, and no store.
+void ResetInstallation(const TempPrefix& prefix, const std::string& config, bool enabled) {
+  std::error_code ec;
+  std::filesystem::remove_all(prefix.root() / kFolderOnD, ec);
+  FUZZ_CHECK(!ec);
+  std::filesystem::remove_all(prefix.root() / kStoreDir, ec);
+  FUZZ_CHECK(!ec);
+  WriteLegacyList(prefix, {{kFolder, static_cast<std::uint16_t>(enabled ? 2 : 0)}});
+  std::filesystem::path folder = prefix.root() / kFolderOnD;
+  prefix.WriteFile(folder / "incoming.pdf", "%PDF-1.4\n");
+  prefix.WriteFile(folder / kSettingsDir / "folder.cfg", config);
+  prefix.WriteFile(folder / kSettingsDir / "[WorkFolder]" / "job.ps", "%!PS\n");
+}
+
+bool Within(const std::string& name, const std::string& dir) {
+  return name.compare(0, dir.size(), dir) == 0 &&
+         (name.size() == dir.size() || name[dir.size()] == '/');
+}
+
+// The entries the run may change: the folder's two settings directories and
+// the store.
+bool MayChange(const std::string& name) {
+  const std::string folder = kFolderOnD;
+  return Within(name, folder + "/" + kSettingsDir) || Within(name, folder + "/" + kRetiredDir) ||
+         Within(name, kStoreDir);
+}
+
+Tree Unchangeable(const Tree& tree) {
+  Tree kept;
+  for (const auto& [name, entry] : tree) {
+    if (!MayChange(name)) kept.emplace(name, entry);
+  }
+  return kept;
+}
+
+// The entries below one directory of the tree, relative to it; empty when
+// the directory is not there.
+Tree Subtree(const Tree& tree, const std::string& dir) {
+  Tree sub;
+  for (const auto& [name, entry] : tree) {
+    if (Within(name, dir)) sub.emplace(name.substr(dir.size()), entry);
+  }
+  return sub;
+}
+
+// What the store received, read back as the inspector reads it.
+std::vector<StoredHotFolder> StoredFolders() {
+  std::vector<StoredHotFolder> folders;
+  if (!std::filesystem::exists(StoreHostPath())) return folders;
+  wxString error;
+  FUZZ_CHECK(ReadStore(StoreHostPath(), &folders, &error));
+  return folders;
+}
+
+bool IsFilterSettingXml(const wxString& text) {
+  wxLogNull quiet;
+  wxStringInputStream stream(text);
+  wxXmlDocument doc;
+  return doc.Load(stream) && doc.GetRoot() && doc.GetRoot()->GetName() == "FilterSetting";
+}
+
+// The store keeps its connection open from one call to the next. Asked to
+// disable a folder in a store that does not exist, it lets go of it: the
+// next run starts from a store that is not there, and each run frees what
+// it allocated, so the check for leaks after each input stays quiet unless
+// something really leaked.
+void ReleaseStore(const TempPrefix& prefix) {
+  std::string nowhere = (prefix.root() / "no-such-prefix").string();
+  setenv("WINEPREFIX", nowhere.c_str(), 1);
+  FUZZ_CHECK(!RODuriZudaze::GetInstance().DisableHotFolder(kFolder));
+  setenv("WINEPREFIX", prefix.root().c_str(), 1);
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+  UseMemoryTempDir();
+  return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  // The listed state follows the input's length, so that disabled folders
+  // are fuzzed as well as enabled ones.
+  const TempPrefix& prefix = Prefix();
+  const bool enabled = size % 2 == 0;
+  ResetInstallation(prefix, std::string(reinterpret_cast<const char*>(data), size), enabled);
+  const Tree before = Snapshot(prefix.root());
+
+  CHFMigrator engine;
+  // The server's directory is found among the running processes; it does
+  // not depend on the input, so the scan is left out.
+  engine.m_ServerDirectory = wxString("C:\\Program Files\\KYR\\HotFolder");
+  FUZZ_CHECK(engine.ReadLegacyList());
+  engine.MigrateFolders();
+
+  FUZZ_CHECK(engine.m_Status.size() == 1);
+  const bool success = engine.m_Status[0] == "Success";
+  FUZZ_CHECK(success || engine.m_Status[0] == "Unknown error");
+
+  // Nothing else in the installation changed, and the settings directory
+  // is whole under exactly one of its two names.
+  const Tree after = Snapshot(prefix.root());
+  FUZZ_CHECK(Unchangeable(after) == Unchangeable(before));
+  const std::string folder = kFolderOnD;
+  const Tree settings = Subtree(before, folder + "/" + kSettingsDir);
+  const Tree kept = Subtree(after, folder + "/" + kSettingsDir);
+  const Tree retired = Subtree(after, folder + "/" + kRetiredDir);
+  FUZZ_CHECK((kept == settings && retired.empty()) || (retired == settings && kept.empty()));
+
+  // A refused folder leaves no trace in the store and keeps its settings
+  // where a later run finds them. A disabled folder may also fail after it
+  // was created, when it cannot be disabled; it then stays as it is.
+  const std::vector<StoredHotFolder> stored = StoredFolders();
+  FUZZ_CHECK(stored.size() <= 1);
+  if (success) {
+    FUZZ_CHECK(stored.size() == 1);
+    FUZZ_CHECK(stored[0].enabled == enabled);
+    FUZZ_CHECK(IsFilterSettingXml(stored[0].filterConfiguration));
+  } else if (enabled) {
+    FUZZ_CHECK(stored.empty());
+    FUZZ_CHECK(kept == settings);
+  }
+  ReleaseStore(prefix);
+  return 0;
+}

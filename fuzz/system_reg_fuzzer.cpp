@@ -1,0 +1,59 @@
+// The registry probe over whatever text sits in the prefix's system.reg. A
+// hive edited by hand or cut short by a crash must give a yes or a no, and
+// the answers must hang together the way registry keys do.
+#include <cstddef>
+#include <cstdint>
+#include <string>
+
+#include "fuzz/fuzz_support.h"
+#include "platform/platform.h"
+#include "tests/temp_prefix.h"
+
+namespace {
+
+// Keys probed in every run, each with its parent keys; the first is the one
+// the tool asks about.
+const wchar_t* const kKeys[] = {
+    L"SOFTWARE\\Wow6432Node\\Tessaly Systems\\Corvane_app\\3.0",
+    L"Software\\Microsoft\\Windows NT\\CurrentVersion",
+    L"System\\CurrentControlSet\\Control\\Session Manager\\Environment",
+    L"Software\\Wine\\Drives",
+};
+
+std::wstring AsciiCase(std::wstring text, bool upper) {
+  for (wchar_t& c : text) {
+    if (upper && c >= L'a' && c <= L'z') c = c - L'a' + L'A';
+    if (!upper && c >= L'A' && c <= L'Z') c = c - L'A' + L'a';
+  }
+  return text;
+}
+
+// A key opens when a section names it or a key below it, ignoring case; so
+// a key that opens has every parent open too, in any letter case.
+void CheckKey(const std::wstring& key) {
+  bool opens = platform::HklmKeyOpensForRead(key);
+  FUZZ_CHECK(platform::HklmKeyOpensForRead(AsciiCase(key, true)) == opens);
+  FUZZ_CHECK(platform::HklmKeyOpensForRead(AsciiCase(key, false)) == opens);
+  if (!opens) return;
+  for (std::size_t cut = key.rfind(L'\\'); cut != std::wstring::npos && cut > 0;
+       cut = key.rfind(L'\\', cut - 1)) {
+    FUZZ_CHECK(platform::HklmKeyOpensForRead(key.substr(0, cut)));
+  }
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+  UseMemoryTempDir();
+  return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  static TempPrefix prefix;
+  prefix.WriteFile(prefix.root() / "system.reg",
+                   std::string(reinterpret_cast<const char*>(data), size));
+  // The empty subkey is HKEY_LOCAL_MACHINE itself, there whenever the hive is.
+  FUZZ_CHECK(platform::HklmKeyOpensForRead(L""));
+  for (const wchar_t* key : kKeys) CheckKey(key);
+  return 0;
+}
