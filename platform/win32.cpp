@@ -136,11 +136,8 @@ bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attribut
 }
 
 bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes) {
-  DWORD bits = attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_DIRECTORY);
-  // Zero would ask the file system to leave the attributes as they are; NORMAL
-  // is how Windows spells "none of them".
-  if (bits == 0) bits = FILE_ATTRIBUTE_NORMAL;
-  return SetFileAttributesW(windows_path.c_str(), bits) != 0;
+  const DWORD settable = attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_DIRECTORY);
+  return SetFileAttributesW(windows_path.c_str(), settable) != 0;
 }
 
 bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
