@@ -218,6 +218,9 @@ bool ReadFolderConfiguration(CHFMigrator& engine, std::size_t index) {
 }
 
 void CHFMigrator::MigrateFolders() {
+  // One outcome per folder: room for all of them at once, rather than
+  // copies of every outcome so far each time the list grows.
+  m_Status.Alloc(m_Status.size() + m_Folders.size());
   for (std::size_t i = 0; i < m_Folders.size(); ++i) {
     if (!ReadFolderConfiguration(*this, i)) {
       m_Status.Add("Failed; File missing");

@@ -3,6 +3,8 @@
 #include <wx/app.h>
 #include <wx/strconv.h>
 
+#include <algorithm>
+#include <cstdint>
 #include <cstring>
 #include <fstream>
 
@@ -60,6 +62,26 @@ unsigned RecordState(const char* record) {
   return state[0] | (state[1] << 8);
 }
 
+// Growing a wxArrayString copies every string it holds, and for a large
+// installation that copy at the last growth is what sets the run's peak
+// memory. The file's size tells how many records follow; a size that no
+// real list has is not trusted beyond a bound.
+void ReserveForRecords(std::istream& in, wxArrayString* folders, wxArrayString* flags) {
+  constexpr std::uint64_t kMaxReserved = 1 << 16;
+  const std::istream::pos_type unknown(-1);
+  std::istream::pos_type here = in.tellg();
+  if (here == unknown) return;  // not seekable: the lists grow as they are read
+  in.seekg(0, std::ios::end);
+  std::istream::pos_type end = in.tellg();
+  in.clear();
+  in.seekg(here);
+  if (end == unknown || end < here) return;
+  std::uint64_t records =
+      std::min<std::uint64_t>(static_cast<std::uint64_t>(end - here) / kRecordSize, kMaxReserved);
+  folders->Alloc(folders->size() + records);
+  flags->Alloc(flags->size() + records);
+}
+
 }  // namespace
 
 bool CHFMigrator::ReadLegacyList() {
@@ -74,6 +96,7 @@ bool CHFMigrator::ReadLegacyList() {
   char header[kHeaderSize];
   if (!in.read(header, kHeaderSize) || !HeaderIsValid(header)) return false;
 
+  ReserveForRecords(in, &m_Folders, &m_EnabledFlags);
   // Only whole records count; a torn write at the end leaves a partial one,
   // which is ignored rather than read as a truncated path.
   bool read_any = false;
