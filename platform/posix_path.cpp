@@ -69,6 +69,17 @@ std::string MatchEntry(const std::string& dir, const std::string& name) {
 // the case of existing entries for as long as the path exists.
 void ResolveParts(const std::vector<std::wstring>& windows_parts, MappedPath* mapped) {
   std::string dir = mapped->root.empty() ? "." : mapped->root;
+  // Nearly every path the tool touches exists exactly as written. One lstat
+  // of the whole path then shows that each component matches itself, which
+  // is what the walk below would find with one lstat per component.
+  std::string whole = dir;
+  for (const std::wstring& windows_part : windows_parts) {
+    mapped->parts.push_back(WideToUtf8(windows_part));
+    whole += "/" + mapped->parts.back();
+  }
+  struct stat st;
+  if (!windows_parts.empty() && lstat(whole.c_str(), &st) == 0) return;
+  mapped->parts.clear();
   bool exists = true;
   for (const std::wstring& windows_part : windows_parts) {
     std::string part = WideToUtf8(windows_part);
