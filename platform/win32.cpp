@@ -52,6 +52,12 @@ class ScopedHandle {
   HANDLE handle_;
 };
 
+// Names of system objects cannot hold a NUL: the system would stop reading at
+// it and act on another, shorter name.
+bool HasNul(const std::wstring& name) {
+  return name.find(L'\0') != std::wstring::npos;
+}
+
 bool IsSeparator(wchar_t c) {
   return c == L'\\' || c == L'/';
 }
@@ -96,6 +102,7 @@ std::wstring CommonAppDataFolder() {
 }
 
 bool RemoveFileSpec(std::wstring* path) {
+  if (path == nullptr) return false;
   std::wstring buffer = *path;
   buffer.push_back(L'\0');
   if (!PathRemoveFileSpecW(&buffer[0])) return false;
@@ -129,6 +136,7 @@ bool CreateDirectories(const std::wstring& windows_path) {
 // The bits come back as the OS reports them, those without a kAttribute*
 // name included, so that writing them back after clearing one keeps the rest.
 bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes) {
+  if (attributes == nullptr) return false;
   DWORD bits = GetFileAttributesW(windows_path.c_str());
   if (bits == INVALID_FILE_ATTRIBUTES) return false;
   *attributes = bits;
@@ -149,14 +157,14 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
 
 bool NamedMutexExists(const std::wstring& name) {
   // An empty name would open nothing named; it is no mutex.
-  if (name.empty()) return false;
+  if (name.empty() || HasNul(name)) return false;
   ScopedHandle mutex(OpenMutexW(kMutexAllAccess, FALSE, name.c_str()));
   return mutex.get() != nullptr;
 }
 
 bool HoldNamedMutex(const std::wstring& name) {
   // An empty name would create an unnamed mutex that no one else can see.
-  if (name.empty()) return false;
+  if (name.empty() || HasNul(name)) return false;
   // Asking again for a mutex this process holds answers yes without a second
   // handle; the system could not tell that case from another holder.
   static std::mutex guard;
@@ -180,9 +188,11 @@ bool HoldNamedMutex(const std::wstring& name) {
 bool LaunchDetached(const std::wstring& file_name) {
   // The name is quoted so that spaces stay part of it; a quote inside it could
   // only end the name early and run something else.
-  if (file_name.empty() || file_name.find(L'"') != std::wstring::npos) return false;
+  // Like the file API, the search reads the name up to its first NUL.
+  const std::wstring name = file_name.substr(0, file_name.find(L'\0'));
+  if (name.empty() || name.find(L'"') != std::wstring::npos) return false;
   // CreateProcessW may write into the command line, so it gets its own copy.
-  std::wstring command_line = L"\"" + file_name + L"\"";
+  std::wstring command_line = L"\"" + name + L"\"";
   STARTUPINFOW startup = {};
   startup.cb = sizeof(startup);
   PROCESS_INFORMATION process = {};
@@ -198,6 +208,7 @@ bool LaunchDetached(const std::wstring& file_name) {
 }
 
 bool EnumerateProcesses(std::vector<ProcessId>* ids) {
+  if (ids == nullptr) return false;
   std::vector<DWORD> table(kMaxProcesses, 0);
   DWORD bytes = 0;
   if (!K32EnumProcesses(table.data(), static_cast<DWORD>(table.size() * sizeof(DWORD)), &bytes)) {
@@ -210,6 +221,7 @@ bool EnumerateProcesses(std::vector<ProcessId>* ids) {
 }
 
 bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* file_name) {
+  if (base_name == nullptr) return false;
   ScopedHandle process(OpenProcess(kProcessRights, FALSE, id));
   if (process.get() == nullptr) return false;
   // Room for one module: the first one listed is the executable.
@@ -240,6 +252,7 @@ bool TerminateProcess(ProcessId id) {
 // ---- Registry ---------------------------------------------------------------
 
 bool HklmKeyOpensForRead(const std::wstring& key) {
+  if (HasNul(key)) return false;
   HKEY opened = nullptr;
   if (RegOpenKeyExW(HKEY_LOCAL_MACHINE, key.c_str(), 0, KEY_READ, &opened) != ERROR_SUCCESS) {
     return false;
@@ -256,6 +269,7 @@ bool StartSockets() {
 }
 
 bool LocalHostName(std::string* name) {
+  if (name == nullptr) return false;
   char buffer[128] = {};
   if (gethostname(buffer, sizeof(buffer)) != 0) return false;
   buffer[sizeof(buffer) - 1] = '\0';
@@ -264,8 +278,11 @@ bool LocalHostName(std::string* name) {
 }
 
 bool HostByName(const std::string& name, std::string* official_name) {
-  // A name with a NUL in it would be looked up as its first part only.
-  if (name.find('\0') != std::string::npos) return false;
+  // A name with a NUL in it would be looked up as its first part only; an
+  // empty one would answer for the local host instead of for no host.
+  if (official_name == nullptr || name.empty() || name.find('\0') != std::string::npos) {
+    return false;
+  }
   const hostent* host = gethostbyname(name.c_str());
   if (host == nullptr || host->h_name == nullptr) return false;
   *official_name = host->h_name;
@@ -273,7 +290,7 @@ bool HostByName(const std::string& name, std::string* official_name) {
 }
 
 bool HostByIPv4Address(const std::string& dotted, std::string* official_name) {
-  if (dotted.find('\0') != std::string::npos) return false;
+  if (official_name == nullptr || dotted.find('\0') != std::string::npos) return false;
   unsigned long address = inet_addr(dotted.c_str());
   if (address == INADDR_NONE) return false;
   const hostent* host = gethostbyaddr(reinterpret_cast<const char*>(&address), 4, AF_INET);

@@ -45,6 +45,8 @@ TEST(Win32Mutex, ProbeNeedsFullAccessAndKeepsNothingOpen) {
   HANDLE held = CreateMutexW(nullptr, TRUE, name.c_str());
   EXPECT_TRUE(platform::NamedMutexExists(name));
   EXPECT_FALSE(platform::HoldNamedMutex(name)) << "held by another holder";
+  const std::wstring cut = name + std::wstring(1, L'\0') + L"more";
+  EXPECT_FALSE(platform::NamedMutexExists(cut)) << "a NUL must not shorten the name";
   ExpectNoHandleLeft([&] { platform::NamedMutexExists(name); });
   CloseHandle(held);
   EXPECT_FALSE(platform::NamedMutexExists(name)) << "a probe kept the mutex alive";
@@ -105,6 +107,7 @@ TEST(Win32Registry, KeyCreatedUnderHklmOpensForReadAndMissingDoesNot) {
   EXPECT_TRUE(platform::HklmKeyOpensForRead(parent));
   EXPECT_TRUE(platform::HklmKeyOpensForRead(parent + L"\\Sub"));
   EXPECT_FALSE(platform::HklmKeyOpensForRead(parent + L"\\Missing"));
+  EXPECT_FALSE(platform::HklmKeyOpensForRead(parent + std::wstring(1, L'\0') + L"\\Missing"));
   ExpectNoHandleLeft([&] { platform::HklmKeyOpensForRead(parent); });
   RegDeleteTreeW(HKEY_LOCAL_MACHINE, parent.c_str());
   EXPECT_FALSE(platform::HklmKeyOpensForRead(parent));
