@@ -36,7 +36,11 @@ export WINEPREFIX="$scratch/prefix" WINEARCH=win64 WINEDEBUG=-all
 # Headless: no display, and no prompts to fetch the .NET and HTML runtimes.
 unset DISPLAY WAYLAND_DISPLAY
 export WINEDLLOVERRIDES="mscoree,mshtml="
-wine wineboot -i >/dev/null 2>&1
+if ! wine wineboot -i >"$scratch/wineboot.log" 2>&1; then
+  cat "$scratch/wineboot.log" >&2
+  echo "test_win32: wineboot could not set up the prefix" >&2
+  exit 1
+fi
 wineserver -w
 
 # The tests find the stand-in here, as a Windows path.
