@@ -3,6 +3,7 @@
 // counts as one that cannot be opened.
 #include <dirent.h>
 #include <errno.h>
+#include <fcntl.h>
 #include <limits.h>
 #include <signal.h>
 #include <spawn.h>
@@ -67,6 +68,17 @@ bool LaunchDetached(const std::wstring& file_name) {
   posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
   posix_spawnattr_setsigmask(&attributes, &no_signals);
   posix_spawnattr_setsigdefault(&attributes, &all_signals);
+  // A detached program keeps none of our standard streams: a server that
+  // outlives us must not hold our caller's pipes open (a test runner or a
+  // script reading our output would otherwise wait for the server to end).
+  posix_spawn_file_actions_t streams;
+  if (posix_spawn_file_actions_init(&streams) != 0) {
+    posix_spawnattr_destroy(&attributes);
+    return false;
+  }
+  posix_spawn_file_actions_addopen(&streams, 0, "/dev/null", O_RDONLY, 0);
+  posix_spawn_file_actions_addopen(&streams, 1, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addopen(&streams, 2, "/dev/null", O_WRONLY, 0);
   const pid_t child = fork();
   if (child == 0) {
     // The intermediate child starts a session of its own, spawns the program
@@ -74,8 +86,9 @@ bool LaunchDetached(const std::wstring& file_name) {
     // as a zombie of ours nor receives our terminal's signals.
     setsid();
     pid_t program;
-    _exit(posix_spawnp(&program, argv[0], nullptr, &attributes, argv, environ) == 0 ? 0 : 1);
+    _exit(posix_spawnp(&program, argv[0], &streams, &attributes, argv, environ) == 0 ? 0 : 1);
   }
+  posix_spawn_file_actions_destroy(&streams);
   posix_spawnattr_destroy(&attributes);
   if (child < 0) return false;
   int status = 0;

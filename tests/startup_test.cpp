@@ -23,7 +23,8 @@ std::string MakeCountingLauncher(const TempPrefix& prefix) {
   std::filesystem::path dir = prefix.root() / "launcher";
   prefix.WriteFile(dir / "hotfolder.exe",
                    "#!/bin/sh\necho launch >> \"$WINEPREFIX/launches.log\"\n"
-                   "exec \"" + BinDir() + "/hotfolder.exe\" \"$@\"\n");
+                   "exec \"" +
+                       BinDir() + "/hotfolder.exe\" \"$@\"\n");
   std::filesystem::permissions(dir / "hotfolder.exe", std::filesystem::perms::owner_all);
   return dir.string();
 }
@@ -36,8 +37,9 @@ int Launches(const TempPrefix& prefix) {
   return count;
 }
 
-// hotfolder.exe processes started for this prefix (their environment names it).
-int ServersOfPrefix(const TempPrefix& prefix) {
+// hotfolder.exe processes started for this prefix (their environment names
+// it); with `kill`, they are ended as well.
+int ServersOfPrefix(const TempPrefix& prefix, bool kill = false) {
   std::vector<platform::ProcessId> ids;
   if (!platform::EnumerateProcesses(&ids)) return -1;
   int count = 0;
@@ -46,7 +48,9 @@ int ServersOfPrefix(const TempPrefix& prefix) {
     if (!platform::QueryProcessModule(id, &base, nullptr) || base != L"hotfolder.exe") continue;
     std::ifstream environ_file("/proc/" + std::to_string(id) + "/environ", std::ios::binary);
     std::string env((std::istreambuf_iterator<char>(environ_file)), {});
-    if (env.find("WINEPREFIX=" + prefix.root().string() + '\0') != std::string::npos) ++count;
+    if (env.find("WINEPREFIX=" + prefix.root().string() + '\0') == std::string::npos) continue;
+    ++count;
+    if (kill) platform::TerminateProcess(id);
   }
   return count;
 }
@@ -96,6 +100,7 @@ TEST(Startup, AbsentServerIsLaunchedOnceAwaitedAndStopped) {
   EXPECT_TRUE(WaitFor([&] { return ServersOfPrefix(prefix) == 0; }, 2000))
       << "the server the tool started is still running";
   EXPECT_FALSE(platform::NamedMutexExists(kServerMutex));
+  ServersOfPrefix(prefix, /*kill=*/true);
 }
 
 }  // namespace
