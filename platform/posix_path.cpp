@@ -251,21 +251,21 @@ bool RemoveFileSpec(std::wstring* path) {
   const bool host_form = !p.empty() && p[0] == L'/';
   const wchar_t separator = host_form ? L'/' : L'\\';
   size_t i = 0;
-  size_t spec = 0;
+  size_t cut = 0;  // where the last component begins
   // The root of "\name" or of a share "\\server\share" is not removed.
-  if (i < p.size() && p[i] == separator) spec = ++i;
-  if (i < p.size() && p[i] == separator) spec = ++i;
+  if (i < p.size() && p[i] == separator) cut = ++i;
+  if (i < p.size() && p[i] == separator) cut = ++i;
   for (; i < p.size() && p[i] != L'\0'; ++i) {
     if (p[i] == separator) {
-      spec = i;
+      cut = i;
     } else if (p[i] == L':' && !host_form) {
       // A drive and its root separator stay: "C:\b.exe" gives "C:\".
-      spec = i + 1;
-      if (i + 1 < p.size() && p[i + 1] == separator) spec = ++i + 1;
+      cut = i + 1;
+      if (i + 1 < p.size() && p[i + 1] == separator) cut = ++i + 1;
     }
   }
-  if (spec >= p.size() || p[spec] == L'\0') return false;
-  p.erase(spec);
+  if (cut >= p.size() || p[cut] == L'\0') return false;
+  p.erase(cut);
   return true;
 }
 
