@@ -70,8 +70,10 @@ const char kDisabledEpsFolder[] = R"(<?xml version="1.0" encoding="UTF-8"?>
 
 TEST(Migration, WholeInstallationEndToEnd) {
   TempPrefix prefix;
-  WriteLegacyList(prefix, {{"D:\\Jobs\\Brochures", 2}, {"D:\\Jobs\\Missing", 2},
-                           {"D:\\Jobs\\Flyers.v2", 0}, {"D:\\Jobs\\Broken", 2}});
+  WriteLegacyList(prefix, {{"D:\\Jobs\\Brochures", 2},
+                           {"D:\\Jobs\\Missing", 2},
+                           {"D:\\Jobs\\Flyers.v2", 0},
+                           {"D:\\Jobs\\Broken", 2}});
   WriteFolderConfig(prefix, "Jobs/Brochures", kPrintFolder);
   std::filesystem::create_directories(OnDriveD(prefix, "Jobs/Missing"));
   WriteFolderConfig(prefix, "Jobs/Flyers.v2", kDisabledEpsFolder);
@@ -123,8 +125,8 @@ TEST(Migration, WholeInstallationEndToEnd) {
   EXPECT_EQ(FilterNames(broken), (std::vector<std::string>{"PDF", "PS", "TIFF", "VDP"}));
 
   for (const char* retired : {"Jobs/Brochures", "Jobs/Flyers.v2", "Jobs/Broken"}) {
-    EXPECT_TRUE(std::filesystem::exists(OnDriveD(prefix, retired) / "[_KYR_HotFolder_Old]" /
-                                        "folder.cfg"))
+    EXPECT_TRUE(
+        std::filesystem::exists(OnDriveD(prefix, retired) / "[_KYR_HotFolder_Old]" / "folder.cfg"))
         << retired;
     EXPECT_FALSE(std::filesystem::exists(OnDriveD(prefix, retired) / "[_KYR_HotFolder_]"));
   }
@@ -132,6 +134,65 @@ TEST(Migration, WholeInstallationEndToEnd) {
   // A second run finds nothing left to migrate and changes nothing.
   EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
   EXPECT_EQ(DumpStore(), dump);
+}
+
+}  // namespace
+
+namespace {
+
+const char kImposedFolder[] = R"(<?xml version="1.0" encoding="UTF-8"?>
+<HotFolderConfiguration>
+  <FolderSettings><WorkFolder>D:\Jobs\Booklets\Work\Spool</WorkFolder></FolderSettings>
+  <ImpositionProperties>
+    <PageSize>A4</PageSize>
+    <ZeroMarginsSupport>true</ZeroMarginsSupport>
+    <ZeroMargins>1</ZeroMargins>
+    <ImpInfoFile>booklets.imp</ImpInfoFile>
+  </ImpositionProperties>
+  <ImposeInfo>
+    <Binding>saddlestitch</Binding>
+    <Creep>0.5</Creep>
+    <Layout><x>2</x><y>1</y><HorizontalGap0>0.25</HorizontalGap0></Layout>
+    <PrinterMarks><ShowCropMarks>YES</ShowCropMarks><ShowFoldLines>NO</ShowFoldLines></PrinterMarks>
+  </ImposeInfo>
+  <ImposeDeliveryInfo><OutputSequence>reverse</OutputSequence></ImposeDeliveryInfo>
+</HotFolderConfiguration>
+)";
+
+TEST(Migration, ImpositionPropertiesReachTheStore) {
+  TempPrefix prefix;
+  WriteLegacyList(prefix, {{"D:\\Jobs\\Booklets", 2}});
+  WriteFolderConfig(prefix, "Jobs/Booklets", kImposedFolder);
+  RunningServer server;
+
+  EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
+
+  json dump = DumpStore();
+  ASSERT_TRUE(dump.is_object()) << "hfstore dump failed";
+  ASSERT_EQ(dump["hotFolders"].size(), 1u);
+  std::vector<std::pair<std::string, std::string>> entries;
+  for (const json& entry : dump["hotFolders"][0]["imposeConfiguration"]) {
+    entries.emplace_back(entry["Name"], entry["Value"]);
+  }
+  const std::string kTemplates =
+      "C:\\Program Files\\Velmo\\Applications3\\Common Files\\KYR\\Plexa3\\template\\";
+  // In the store's key order (UTF-16 code units: capitals before "Imp"...).
+  const std::vector<std::pair<std::string, std::string>> expected = {
+      {"PageSize", "A4"},
+      {"QXDeliverySeq", "1"},
+      {"QXImpBinding", "3"},
+      {"QXImpCreeps", "32768.000000 32768.000000"},
+      {"QXImpFdCreeps", "0.5 0.5"},
+      {"QXImpFdGaps", "10 0.25 10 "},
+      {"QXImpFdValues", "1"},
+      {"QXImpLayout", "2 1"},
+      {"QXImpMarks", "1 2 0 0 0"},
+      {"QXImpSpineFold", "0"},
+      {"QXImpThickness", "0"},
+      {"QXImpZeroMargin", "True"},
+      {"QXImposeTemplate", kTemplates + "customTemplateHF2.x-Booklets.dbt"},
+  };
+  EXPECT_EQ(entries, expected);
 }
 
 }  // namespace
