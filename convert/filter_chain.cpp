@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstring>
 
+#include "convert/ascii_text.h"
 #include "convert/registration.h"
 #include "convert/server_lookup.h"
 
@@ -119,16 +120,17 @@ const DefaultFilter kDefaultChain[] = {
 
 void Append(FilterChain* chain, const SettingsMap& settings, const char* identifier,
             const char* display_name) {
-  chain->root->AddChild(BuildFilterElement(settings, identifier));
-  chain->entries.push_back({display_name, identifier});
+  wxString id = AsciiText(identifier);
+  chain->root->AddChild(BuildFilterElement(settings, id));
+  chain->entries.push_back({AsciiText(display_name), id});
 }
 
 void WriteFixedValues(CHFMigrator& engine, const DefaultFilter& filter) {
   SettingsMap& settings = engine.*filter.settings;
   for (std::size_t i = 0; i < filter.fixed_count; ++i) {
     const FixedValue& fixed = filter.fixed_values[i];
-    settings.GetOrInsert(fixed.key) =
-        fixed.value ? wxString(fixed.value) : CachedServerDirectory(engine.m_ServerDirectory);
+    settings.GetOrInsert(AsciiText(fixed.key)) =
+        fixed.value ? AsciiText(fixed.value) : CachedServerDirectory(engine.m_ServerDirectory);
   }
 }
 
@@ -140,7 +142,9 @@ FilterChain BuildFilterChain(CHFMigrator& engine) {
   bool default_chain = true;
   bool legacy_tiff = false;
   for (const LegacyFilter& filter : kLegacyFilters) {
-    if (engine.m_FilterEnable.GetOrInsert(filter.enable_key) != "1") continue;
+    if (engine.m_FilterEnable.GetOrInsert(AsciiText(filter.enable_key)) != wxS("1")) {
+      continue;
+    }
     Append(&chain, engine.*filter.settings, filter.identifier, filter.display_name);
     if (filter.suppresses_default_chain) default_chain = false;
     if (std::strcmp(filter.enable_key, "TIFF2PDF") == 0) legacy_tiff = true;

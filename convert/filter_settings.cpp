@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "app/migrator.h"
+#include "convert/ascii_text.h"
 #include "convert/numbers.h"
 #include "convert/server_lookup.h"
 
@@ -12,11 +13,15 @@ namespace {
 // holds (from this folder or an earlier one) keeps its place and takes the
 // new value.
 void Set(SettingsMap& map, const char* key, const wxString& value) {
-  map.GetOrInsert(key) = value;
+  map.GetOrInsert(AsciiText(key)) = value;
+}
+
+void Set(SettingsMap& map, const char* key, const char* value) {
+  Set(map, key, AsciiText(value));
 }
 
 void WriteFlagPair(const ConversionRow& row, const wxString& value, SettingsMap& out) {
-  const bool on = value == row.on_value;
+  const bool on = value == AsciiText(row.on_value);
   const char* key_value = on ? "1" : "0";
   const char* other_value = on ? "0" : "1";
   if (row.rule == Rule::kFlagPairOtherFirst) {
@@ -51,7 +56,7 @@ void ApplyRule(const ConversionRow& row, const wxString& value, SettingsMap& out
       WritePointsAsInches(row, value, out);
       break;
     case Rule::kAuto:
-      if (value == "1") Set(out, row.key, "Auto");
+      if (value == wxS("1")) Set(out, row.key, "Auto");
       break;
     case Rule::kPosition:
       if (const char* text = ImagePositionText(value)) Set(out, row.key, text);
@@ -69,14 +74,14 @@ void ApplyRule(const ConversionRow& row, const wxString& value, SettingsMap& out
 wxString FixedValue(CHFMigrator& m, const FixedSetting& setting) {
   switch (setting.source) {
     case FixedSource::kLiteral:
-      return setting.value;
+      return AsciiText(setting.value);
     case FixedSource::kPexFilterEnabled:
-      return m.m_FilterEnable.GetOrInsert("PEXFILTER") == "1" ? "1" : "0";
+      return m.m_FilterEnable.GetOrInsert(wxS("PEXFILTER")) == wxS("1") ? wxS("1") : wxS("0");
     case FixedSource::kServerDirectory:
       return CachedServerDirectory(m.m_ServerDirectory);
     case FixedSource::kPrinterName: {
-      const wxString* name = m.m_FilterSettings.Find("PRINTERNAME");
-      return name ? *name : wxString(setting.value);
+      const wxString* name = m.m_FilterSettings.Find(wxS("PRINTERNAME"));
+      return name ? *name : AsciiText(setting.value);
     }
   }
   return wxString();
@@ -126,7 +131,9 @@ void RunConversionStep(CHFMigrator& migrator, const SettingsMap& legacy, const C
                        SettingsMap& converted) {
   if (legacy.Empty()) return;
   for (const ConversionRow& row : step.rows) {
-    if (const wxString* value = legacy.Find(row.legacy_key)) ApplyRule(row, *value, converted);
+    if (const wxString* value = legacy.Find(AsciiText(row.legacy_key))) {
+      ApplyRule(row, *value, converted);
+    }
   }
   WriteFixed(migrator, step.fixed, converted);
 }
@@ -146,8 +153,8 @@ bool CHFMigrator::ConvertFilterSettings() {
 }
 
 void CHFMigrator::ApplyPdfConversion() {
-  const wxString* switched = m_FilterSettings.Find("PDFCONVERSION");
-  if (!switched || *switched != "1") return;
+  const wxString* switched = m_FilterSettings.Find(wxS("PDFCONVERSION"));
+  if (!switched || *switched != wxS("1")) return;
   for (SettingsMap CHFMigrator::*map : kPdfConversionMaps) {
     Set(this->*map, "OUTPUTFILETYPEPDF", "1");
     Set(this->*map, "OUTPUTFILETYPEPS", "0");

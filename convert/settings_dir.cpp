@@ -6,9 +6,11 @@
 
 namespace {
 
-const char kSettingsDirName[] = "[_KYR_HotFolder_]";
-const char kRetiredDirName[] = "[_KYR_HotFolder_Old]";
-const char kSeparator[] = "\\";
+// Wide, as the paths are: a narrow text would be converted by the C
+// library's multibyte conversion at every join.
+const wchar_t kSettingsDirName[] = L"[_KYR_HotFolder_]";
+const wchar_t kRetiredDirName[] = L"[_KYR_HotFolder_Old]";
+const wchar_t kSeparator[] = L"\\";
 
 // Attributes that would make the move fail on Windows.
 constexpr std::uint32_t kBlockingAttributes =
@@ -38,9 +40,9 @@ FolderPaths MakeFolderPaths(const wxString& folder_path) {
   paths.full_path = file_name.GetFullPath(wxPATH_WIN);
   paths.name = file_name.GetName();
   paths.settings = paths.full_path + kSeparator + kSettingsDirName;
-  paths.work = paths.settings + kSeparator + "[WorkFolder]";
-  paths.failed = paths.settings + kSeparator + "[FailedFolder]";
-  paths.move = paths.settings + kSeparator + "[MoveFolder]";
+  paths.work = paths.settings + kSeparator + L"[WorkFolder]";
+  paths.failed = paths.settings + kSeparator + L"[FailedFolder]";
+  paths.move = paths.settings + kSeparator + L"[MoveFolder]";
   paths.retired = paths.full_path + kSeparator + kRetiredDirName;
   return paths;
 }

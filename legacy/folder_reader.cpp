@@ -15,39 +15,41 @@ namespace {
 
 using MapMember = SettingsMap CHFMigrator::*;
 
+// Names are wide, as the document's are: a narrow literal would pass through
+// the C library's multibyte conversion on every search, for every folder.
 struct Section {
-  const char* name;
+  const wchar_t* name;
   MapMember map;
 };
 
 const Section kLeadingSections[] = {
-    {"FolderSettings", &CHFMigrator::m_FolderSettings},
-    {"FILTERSETTINGS", &CHFMigrator::m_FilterSettings},
+    {L"FolderSettings", &CHFMigrator::m_FolderSettings},
+    {L"FILTERSETTINGS", &CHFMigrator::m_FilterSettings},
 };
 
 // The filters with a settings section of their own; each also names its
 // entry in the filter-enable map.
 const Section kFilterSections[] = {
-    {"ONEBITTIFF", &CHFMigrator::m_OneBitTiff}, {"CTLWFILTER", &CHFMigrator::m_CtlwFilter},
-    {"DCS2FILTER", &CHFMigrator::m_Dcs2Filter}, {"EPS2PSFILTER", &CHFMigrator::m_Eps2PsFilter},
-    {"EXPORTPS", &CHFMigrator::m_ExportPs},     {"JPEG2PDF", &CHFMigrator::m_Jpeg2Pdf},
-    {"PDF2GO", &CHFMigrator::m_Pdf2Go},         {"PEXFILTER", &CHFMigrator::m_PexFilter},
-    {"TIFF2PDF", &CHFMigrator::m_Tiff2Pdf},     {"TIFFITFILTER", &CHFMigrator::m_TiffItFilter},
+    {L"ONEBITTIFF", &CHFMigrator::m_OneBitTiff}, {L"CTLWFILTER", &CHFMigrator::m_CtlwFilter},
+    {L"DCS2FILTER", &CHFMigrator::m_Dcs2Filter}, {L"EPS2PSFILTER", &CHFMigrator::m_Eps2PsFilter},
+    {L"EXPORTPS", &CHFMigrator::m_ExportPs},     {L"JPEG2PDF", &CHFMigrator::m_Jpeg2Pdf},
+    {L"PDF2GO", &CHFMigrator::m_Pdf2Go},         {L"PEXFILTER", &CHFMigrator::m_PexFilter},
+    {L"TIFF2PDF", &CHFMigrator::m_Tiff2Pdf},     {L"TIFFITFILTER", &CHFMigrator::m_TiffItFilter},
 };
 
 const Section kDriverSections[] = {
-    {"DriverSettings", &CHFMigrator::m_DriverSettings},
-    {"ImpositionProperties", &CHFMigrator::m_ImpositionProperties},
-    {"ImposeDeliveryInfo", &CHFMigrator::m_ImposeDeliveryInfo},
+    {L"DriverSettings", &CHFMigrator::m_DriverSettings},
+    {L"ImpositionProperties", &CHFMigrator::m_ImpositionProperties},
+    {L"ImposeDeliveryInfo", &CHFMigrator::m_ImposeDeliveryInfo},
 };
 
 // Imposition sections whose nested parts are flattened into one map.
 const Section kImposeSections[] = {
-    {"ImposeInfo", &CHFMigrator::m_ImposeInfo},
-    {"ImposeInfoVDP", &CHFMigrator::m_ImposeInfoVDP},
+    {L"ImposeInfo", &CHFMigrator::m_ImposeInfo},
+    {L"ImposeInfoVDP", &CHFMigrator::m_ImposeInfoVDP},
 };
-const char* const kImposeParts[] = {"Layout", "SheetSize", "SheetMargin", "PaperSize",
-                                    "PrinterMarks"};
+const wchar_t* const kImposeParts[] = {L"Layout", L"SheetSize", L"SheetMargin", L"PaperSize",
+                                       L"PrinterMarks"};
 
 enum class LegacyFilter { kOffice, kPdf2Ps, kXrx };
 
@@ -99,7 +101,7 @@ const LegacyFilter* IdentifyFilter(const wxString& identifier) {
 }
 
 wxString Flag(bool on) {
-  return on ? "1" : "0";
+  return on ? wxS("1") : wxS("0");
 }
 
 // Each filter's entry gets the enable text of its own container, or an empty
@@ -118,7 +120,7 @@ void ReadFilterSections(CHFMigrator& engine, wxXmlNode* root) {
 // The containers without a settings section are known by identifier only.
 void ReadFilterContainers(CHFMigrator& engine, wxXmlNode* root) {
   std::int64_t office_count = 0;  // a sum of 32-bit terms cannot overflow it
-  for (const wxXmlNode* node = FindElement(root, "FILTERID"); node; node = node->GetNext()) {
+  for (const wxXmlNode* node = FindElement(root, wxS("FILTERID")); node; node = node->GetNext()) {
     const wxXmlNode* first = NthChild(node, 0);
     wxString enable;
     if (!first || !ContainerEnableText(node, &enable)) continue;
@@ -129,23 +131,23 @@ void ReadFilterContainers(CHFMigrator& engine, wxXmlNode* root) {
         office_count += ReadInt32(enable);  // no leading number counts 0
         break;
       case LegacyFilter::kPdf2Ps:
-        engine.m_FilterEnable.GetOrInsert("PDF2PS") = Flag(enable == "1");
+        engine.m_FilterEnable.GetOrInsert(wxS("PDF2PS")) = Flag(enable == wxS("1"));
         break;
       case LegacyFilter::kXrx:
-        engine.m_FilterEnable.GetOrInsert("XRX") = Flag(enable == "1");
+        engine.m_FilterEnable.GetOrInsert(wxS("XRX")) = Flag(enable == wxS("1"));
         break;
     }
   }
-  engine.m_FilterEnable.GetOrInsert("MICROSOFT") = Flag(office_count > 0);
+  engine.m_FilterEnable.GetOrInsert(wxS("MICROSOFT")) = Flag(office_count > 0);
 }
 
-void ReadImposeSection(wxXmlNode* root, const char* name, SettingsMap& map) {
+void ReadImposeSection(wxXmlNode* root, const wchar_t* name, SettingsMap& map) {
   wxXmlNode* section = FindElement(root, name);
   if (!section) return;
   ReadSection(section, map);
   for (const wxXmlNode* child = section->GetChildren(); child; child = child->GetNext()) {
     if (child->GetType() != wxXML_ELEMENT_NODE) continue;
-    for (const char* part : kImposeParts) {
+    for (const wchar_t* part : kImposeParts) {
       if (child->GetName() == part) ReadSection(child, map);
     }
   }
@@ -203,16 +205,16 @@ void ReadSection(const wxXmlNode* section, SettingsMap& map) {
 bool ReadFolderConfiguration(CHFMigrator& engine, std::size_t index) {
   if (index >= engine.m_Folders.size()) return false;
   const wxString& folder = engine.m_Folders[index];
-  wxString config = folder + "\\[_KYR_HotFolder_]\\folder.cfg";
+  wxString config = folder + wxS("\\[_KYR_HotFolder_]\\folder.cfg");
   if (!platform::FileExists(config.ToStdWstring())) return false;
 
   engine.ClearSettingsMaps();
-  engine.m_FolderSettings.GetOrInsert("HFFolderPath") = folder;
+  engine.m_FolderSettings.GetOrInsert(wxS("HFFolderPath")) = folder;
   wxXmlDocument doc;
   if (LoadFolderConfig(config, &doc)) ReadDocument(engine, doc.GetRoot());
 
   bool listed_disabled =
-      index < engine.m_EnabledFlags.size() && engine.m_EnabledFlags[index] == "0";
+      index < engine.m_EnabledFlags.size() && engine.m_EnabledFlags[index] == wxS("0");
   engine.m_CurrentEnabled = !listed_disabled;
   return true;
 }

@@ -27,7 +27,7 @@ const Replacement kReplacements[] = {
 };
 
 const char* Replace(wchar_t c, Escape escape) {
-  if (escape == Escape::kNone) return nullptr;
+  if (escape == Escape::kNone || c > L'>') return nullptr;  // '>' is the highest escaped
   for (const Replacement& r : kReplacements) {
     if (r.c == c && (!r.attribute_only || escape == Escape::kAttribute)) return r.text;
   }
@@ -64,6 +64,10 @@ bool Append(const wxString& text, Escape escape, std::string* out) {
       continue;
     }
     std::uint32_t code = static_cast<std::uint32_t>(*c);
+    if (code < 0x80) {
+      out->push_back(static_cast<char>(code));
+      continue;
+    }
     if (sizeof(wchar_t) == 2 && code >= 0xD800 && code <= 0xDBFF && c + 1 != end) {
       std::uint32_t low = static_cast<std::uint32_t>(c[1]);
       if (low >= 0xDC00 && low <= 0xDFFF) {

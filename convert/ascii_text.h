@@ -1,0 +1,19 @@
+// Table texts as wide strings.
+#ifndef HF_CONVERT_ASCII_TEXT_H_
+#define HF_CONVERT_ASCII_TEXT_H_
+
+#include <wx/string.h>
+
+#include <cstring>
+#include <string>
+
+// The texts of the conversion tables are ASCII, which widens character by
+// character to the same wide text in every locale. wxString's conversion of
+// a narrow text (wxString::FromAscii too) runs the C library's multibyte
+// conversion instead, and for the hundred-odd table texts a folder uses that
+// cost more than the rest of its conversion.
+inline wxString AsciiText(const char* ascii) {
+  return wxString(std::wstring(ascii, ascii + std::strlen(ascii)));
+}
+
+#endif  // HF_CONVERT_ASCII_TEXT_H_
