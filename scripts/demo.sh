@@ -31,13 +31,14 @@ echo "Hot folders in the configuration store (enabled, name, folder, filter chai
 hfstore list
 echo
 echo "Legacy settings directories retired to [_KYR_HotFolder_Old]:"
-find "$prefix/drive_d" -mindepth 3 -maxdepth 3 -type d -name '\[_KYR_HotFolder_Old\]' \
-  | sed "s|^$prefix/drive_d/|  D:/|" | sort
-echo "Folders without legacy settings (not migrated):"
+# Shown as the Windows paths they are: D:\Jobs\... for $prefix/drive_d/Jobs/...
+windows() { local rest=${1#"$prefix/drive_d/"}; echo "  D:\\${rest//\//\\}"; }
 for dir in "$prefix"/drive_d/Jobs/*/; do
-  if [ ! -e "$dir[_KYR_HotFolder_]" ] && [ ! -e "$dir[_KYR_HotFolder_Old]" ]; then
-    echo "  D:/${dir#"$prefix/drive_d/"}"
-  fi
+  [ -d "$dir[_KYR_HotFolder_Old]" ] && windows "$dir[_KYR_HotFolder_Old]"
+done
+echo "Folders whose legacy settings stay in place (not migrated):"
+for dir in "$prefix"/drive_d/Jobs/*/; do
+  [ -d "$dir[_KYR_HotFolder_Old]" ] || windows "${dir%/}"
 done
 echo
 echo "The full store as JSON: WINEPREFIX=$prefix build/bin/hfstore dump"
