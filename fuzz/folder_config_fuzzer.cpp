@@ -6,6 +6,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <string>
 #include <system_error>
 #include <vector>
@@ -28,6 +30,19 @@ const char kFolderOnD[] = "drive_d/Jobs/Fuzz";
 const char kSettingsDir[] = "[_KYR_HotFolder_]";
 const char kRetiredDir[] = "[_KYR_HotFolder_Old]";
 const char kStoreDir[] = "drive_c/ProgramData/KYR/Dirorodiv";
+const char kDamagedStore[] = "not a database\n";
+
+// How the legacy folder is listed and what the store makes of it. Both
+// follow the input's length, so that every input is tried in each of them
+// as the fuzzer lengthens and shortens it.
+struct Situation {
+  bool enabled;  // listed with state 2
+  bool refused;  // a damaged file sits where the store belongs
+};
+
+Situation SituationFor(std::size_t size) {
+  return Situation{size % 2 == 0, size % 3 == 0};
+}
 
 // One prefix for the whole process: the C library keeps every distinct
 // WINEPREFIX value it was ever given, so a prefix per input would grow the
@@ -38,14 +53,16 @@ const TempPrefix& Prefix() {
 }
 
 // The installation as the legacy service left it, the folder under test
-// with a job waiting in it and a spool file beside folder.cfg, and no store.
-void ResetInstallation(const TempPrefix& prefix, const std::string& config, bool enabled) {
+// with a job waiting in it and a spool file beside folder.cfg; no store, or
+// one the store refuses to write into.
+void ResetInstallation(const TempPrefix& prefix, const std::string& config, Situation situation) {
   std::error_code ec;
   std::filesystem::remove_all(prefix.root() / kFolderOnD, ec);
   FUZZ_CHECK(!ec);
   std::filesystem::remove_all(prefix.root() / kStoreDir, ec);
   FUZZ_CHECK(!ec);
-  WriteLegacyList(prefix, {{kFolder, static_cast<std::uint16_t>(enabled ? 2 : 0)}});
+  WriteLegacyList(prefix, {{kFolder, static_cast<std::uint16_t>(situation.enabled ? 2 : 0)}});
+  if (situation.refused) prefix.WriteFile(StoreHostPath(), kDamagedStore);
   std::filesystem::path folder = prefix.root() / kFolderOnD;
   prefix.WriteFile(folder / "incoming.pdf", "%PDF-1.4\n");
   prefix.WriteFile(folder / kSettingsDir / "folder.cfg", config);
@@ -92,6 +109,11 @@ std::vector<StoredHotFolder> StoredFolders() {
   return folders;
 }
 
+std::string FileBytes(const std::filesystem::path& path) {
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), {});
+}
+
 bool IsFilterSettingXml(const wxString& text) {
   wxLogNull quiet;
   wxStringInputStream stream(text);
@@ -119,11 +141,9 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  // The listed state follows the input's length, so that disabled folders
-  // are fuzzed as well as enabled ones.
   const TempPrefix& prefix = Prefix();
-  const bool enabled = size % 2 == 0;
-  ResetInstallation(prefix, std::string(reinterpret_cast<const char*>(data), size), enabled);
+  const Situation situation = SituationFor(size);
+  ResetInstallation(prefix, std::string(reinterpret_cast<const char*>(data), size), situation);
   const Tree before = Snapshot(prefix.root());
 
   CHFMigrator engine;
@@ -147,16 +167,26 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const Tree retired = Subtree(after, folder + "/" + kRetiredDir);
   FUZZ_CHECK((kept == settings && retired.empty()) || (retired == settings && kept.empty()));
 
-  // A refused folder leaves no trace in the store and keeps its settings
-  // where a later run finds them. A disabled folder may also fail after it
-  // was created, when it cannot be disabled; it then stays as it is.
+  // A refused folder keeps its settings where a later run finds them, and
+  // the store writes nothing into a file it does not know.
+  if (situation.refused) {
+    FUZZ_CHECK(!success);
+    FUZZ_CHECK(kept == settings);
+    FUZZ_CHECK(FileBytes(StoreHostPath()) == kDamagedStore);
+    ReleaseStore(prefix);
+    return 0;
+  }
+
+  // Otherwise the folder is registered, as it was listed, with a filter
+  // tree that reads back. A disabled folder may still fail after it was
+  // created, when it cannot be disabled; it then stays as it is.
   const std::vector<StoredHotFolder> stored = StoredFolders();
   FUZZ_CHECK(stored.size() <= 1);
   if (success) {
     FUZZ_CHECK(stored.size() == 1);
-    FUZZ_CHECK(stored[0].enabled == enabled);
+    FUZZ_CHECK(stored[0].enabled == situation.enabled);
     FUZZ_CHECK(IsFilterSettingXml(stored[0].filterConfiguration));
-  } else if (enabled) {
+  } else if (situation.enabled) {
     FUZZ_CHECK(stored.empty());
     FUZZ_CHECK(kept == settings);
   }
