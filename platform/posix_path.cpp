@@ -65,31 +65,35 @@ std::string MatchEntry(const std::string& dir, const std::string& name) {
   return matches == 1 ? match : std::string();
 }
 
+// How many leading components exist exactly as written, as far as one or two
+// lstat calls can tell: nearly every path the tool touches exists, or all of
+// it but its last component does (a name about to be created). An lstat of
+// such a path shows that each of those components matches itself, which is
+// what the walk in ResolveParts finds with one lstat per component.
+size_t ExactPrefix(const std::string& dir, const std::vector<std::string>& parts) {
+  if (parts.empty()) return 0;
+  std::string path = dir;
+  for (const std::string& part : parts) path += "/" + part;
+  struct stat st;
+  if (lstat(path.c_str(), &st) == 0) return parts.size();
+  if (parts.size() < 2) return 0;
+  path.resize(path.size() - parts.back().size() - 1);
+  return lstat(path.c_str(), &st) == 0 ? parts.size() - 1 : 0;
+}
+
 // Turns the Windows components into host components below `root`, following
 // the case of existing entries for as long as the path exists.
 void ResolveParts(const std::vector<std::wstring>& windows_parts, MappedPath* mapped) {
   std::string dir = mapped->root.empty() ? "." : mapped->root;
-  // Nearly every path the tool touches exists exactly as written. One lstat
-  // of the whole path then shows that each component matches itself, which
-  // is what the walk below would find with one lstat per component.
-  std::string whole = dir;
-  for (const std::wstring& windows_part : windows_parts) {
-    mapped->parts.push_back(WideToUtf8(windows_part));
-    whole += "/" + mapped->parts.back();
-  }
-  struct stat st;
-  if (!windows_parts.empty() && lstat(whole.c_str(), &st) == 0) return;
-  mapped->parts.clear();
-  bool exists = true;
-  for (const std::wstring& windows_part : windows_parts) {
-    std::string part = WideToUtf8(windows_part);
-    if (exists) {
-      const std::string match = MatchEntry(dir, part);
-      exists = !match.empty();
-      if (exists) part = match;
-      dir += "/" + part;
-    }
-    mapped->parts.push_back(part);
+  std::vector<std::string>& parts = mapped->parts;
+  for (const std::wstring& windows_part : windows_parts) parts.push_back(WideToUtf8(windows_part));
+  const size_t exact = ExactPrefix(dir, parts);
+  for (size_t i = 0; i < exact; ++i) dir += "/" + parts[i];
+  for (size_t i = exact; i < parts.size(); ++i) {
+    const std::string match = MatchEntry(dir, parts[i]);
+    if (match.empty()) break;  // the rest does not exist; it keeps its case
+    parts[i] = match;
+    dir += "/" + match;
   }
 }
 
