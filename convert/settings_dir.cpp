@@ -22,8 +22,7 @@ std::optional<std::uint32_t> ReadAttributes(const wxString& path) {
   return attributes;
 }
 
-void ClearBlockingAttributes(const wxString& path) {
-  std::optional<std::uint32_t> attributes = ReadAttributes(path);
+void ClearBlockingAttributes(const wxString& path, std::optional<std::uint32_t> attributes) {
   if (!attributes || (*attributes & kBlockingAttributes) == 0) return;
   platform::SetFileAttributes(path.ToStdWstring(), *attributes & ~kBlockingAttributes);
 }
@@ -49,11 +48,13 @@ FolderPaths MakeFolderPaths(const wxString& folder_path) {
 
 Retirement RetireSettingsDirectory(const FolderPaths& paths) {
   Retirement retirement;
+  // The attributes read to be restored are the ones cleared before the
+  // first move; a second attempt reads them afresh.
   retirement.attributes = ReadAttributes(paths.settings);
-  ClearBlockingAttributes(paths.settings);
+  ClearBlockingAttributes(paths.settings, retirement.attributes);
   retirement.moved = Move(paths.settings, paths.retired);
   if (!retirement.moved) {
-    ClearBlockingAttributes(paths.settings);
+    ClearBlockingAttributes(paths.settings, ReadAttributes(paths.settings));
     retirement.moved = Move(paths.settings, paths.retired);
   }
   return retirement;
