@@ -2,21 +2,24 @@
 # The benchmark: hfmigrate against the floor.
 #
 # For each size (default 1,000 and 10,000 folders) it generates a legacy
-# installation into a fresh Wine-style prefix under ${TMPDIR:-/tmp}, copies
-# it, runs hfmigrate over the first copy with the hot-folder server already
-# running there (so the seven-second start-up wait is not measured), and the
-# floor over the second: the reads, moves and durable commits that any
+# installation under ${TMPDIR:-/tmp} and, BENCH_RUNS times (default 3), runs
+# hfmigrate over a fresh copy with the hot-folder server already running in
+# it (so the seven-second start-up wait is not measured), then the floor
+# over another fresh copy: the reads, moves and durable commits that any
 # migration of the same folders must do, with the rows per folder taken from
-# the store hfmigrate wrote. It prints wall time, time per folder, peak
-# memory and the ratio to the floor, then checks the targets.
+# the store hfmigrate wrote. Durable commits vary from one moment to the
+# next, so the two alternate and the median run of each counts. It prints
+# wall time, time per folder, peak memory and the ratio to the floor, then
+# checks the targets.
 #
-#   scripts/bench.sh [COUNT...]
+#   [BENCH_RUNS=N] scripts/bench.sh [COUNT...]
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 sizes=("$@")
 [ ${#sizes[@]} -eq 0 ] && sizes=(1000 10000)
 seed=1
+runs=${BENCH_RUNS:-3}
 build=build-bench
 
 scripts/setup.sh
@@ -61,6 +64,12 @@ measure_tool() {
   start_server "$prefix"
   sync
   WINEPREFIX="$prefix" "$bin/hfbench_measure" "$out" "$bin/hfmigrate"
+  local status
+  read -r _ _ status <"$out"
+  if [ "$status" -ne 255 ]; then
+    echo "bench: hfmigrate ended with status $status, not 255" >&2
+    exit 1
+  fi
   if ! kill -0 "$server" 2>/dev/null; then
     echo "bench: the server was stopped during the run; measure again" >&2
     exit 1
@@ -68,38 +77,57 @@ measure_tool() {
   stop_server
 }
 
+# The median wall time of the runs in file $1 ("wall rss status" lines),
+# with the largest peak memory seen.
+median() {
+  sort -n "$1" | awk '{ wall[NR] = $1; if ($2 > rss) rss = $2 }
+                      END { print wall[int((NR + 1) / 2)], rss }'
+}
+
 results="$work/results"
 : >"$results"
 for n in "${sizes[@]}"; do
-  tool="$work/tool-$n"
-  floor="$work/floor-$n"
-  expected=$("$bin/hfbench_generate" "$tool" "$n" "$seed")
-  cp -a "$tool" "$floor"
+  base="$work/base-$n"
+  expected=$("$bin/hfbench_generate" "$base" "$n" "$seed")
+  : >"$work/tool-$n.runs"
+  : >"$work/floor-$n.runs"
+  for run in $(seq "$runs"); do
+    tool="$work/tool-$n"
+    floor="$work/floor-$n"
+    cp -a "$base" "$tool"
+    cp -a "$base" "$floor"
 
-  measure_tool "$tool" "$work/tool-$n.time"
-  registered=$(WINEPREFIX="$tool" "$bin/hfstore" list | wc -l)
-  if [ "$registered" -ne "$expected" ]; then
-    echo "bench: $registered of $expected folders registered at $n" >&2
-    exit 1
-  fi
+    measure_tool "$tool" "$work/run.time"
+    cat "$work/run.time" >>"$work/tool-$n.runs"
+    if [ "$run" -eq 1 ]; then
+      registered=$(WINEPREFIX="$tool" "$bin/hfstore" list | wc -l)
+      if [ "$registered" -ne "$expected" ]; then
+        echo "bench: $registered of $expected folders registered at $n" >&2
+        exit 1
+      fi
+      "$bin/hfbench_floor" plan "$(store_of "$tool")" >"$work/plan-$n"
+    fi
 
-  "$bin/hfbench_floor" plan "$(store_of "$tool")" >"$work/plan-$n"
-  sync
-  "$bin/hfbench_measure" "$work/floor-$n.time" "$bin/hfbench_floor" run "$floor" "$work/plan-$n"
-  read -r _ _ floor_status <"$work/floor-$n.time"
-  if [ "$floor_status" -ne 0 ]; then
-    echo "bench: the floor failed at $n" >&2
-    exit 1
-  fi
-  echo "$n $(cat "$work/tool-$n.time") $(cat "$work/floor-$n.time")" >>"$results"
-  rm -rf "$tool" "$floor"
+    sync
+    "$bin/hfbench_measure" "$work/run.time" "$bin/hfbench_floor" run "$floor" "$work/plan-$n"
+    read -r _ _ floor_status <"$work/run.time"
+    if [ "$floor_status" -ne 0 ]; then
+      echo "bench: the floor failed at $n" >&2
+      exit 1
+    fi
+    cat "$work/run.time" >>"$work/floor-$n.runs"
+    rm -rf "$tool" "$floor"
+  done
+  rm -rf "$base"
+  echo "$n $(median "$work/tool-$n.runs") $(median "$work/floor-$n.runs")" >>"$results"
 done
 
-awk '
+awk -v runs="$runs" '
   {
-    n[NR] = $1; tw[NR] = $2; tr[NR] = $3; fw[NR] = $5; fr[NR] = $6
+    n[NR] = $1; tw[NR] = $2; tr[NR] = $3; fw[NR] = $4; fr[NR] = $5
   }
   END {
+    printf "Median of %d runs per size.\n\n", runs
     print "| Folders | hfmigrate | per folder | peak RSS | floor | per folder | peak RSS | ratio to floor |"
     print "|--------:|----------:|-----------:|---------:|------:|-----------:|---------:|---------------:|"
     for (i = 1; i <= NR; i++) {
