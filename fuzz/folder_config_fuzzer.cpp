@@ -3,6 +3,7 @@
 // accumulated over years, some damaged, must neither crash the tool nor
 // lose a folder's settings: they end up either registered and retired, or
 // refused and back where a later run finds them.
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
@@ -18,6 +19,7 @@
 
 #include "app/migrator.h"
 #include "fuzz/fuzz_support.h"
+#include "legacy/xml_load.h"
 #include "store/store.h"
 #include "store/store_reader.h"
 #include "tests/legacy_fixture.h"
@@ -121,6 +123,36 @@ bool IsFilterSettingXml(const wxString& text) {
   return doc.Load(stream) && doc.GetRoot() && doc.GetRoot()->GetName() == "FilterSetting";
 }
 
+// How deep the elements of a loaded document nest, counted without
+// recursion so that the count itself cannot overflow the stack.
+int Depth(const wxXmlNode* root) {
+  int deepest = 0;
+  int depth = 1;
+  for (const wxXmlNode* node = root; node;) {
+    if (node->GetType() == wxXML_ELEMENT_NODE) deepest = std::max(deepest, depth);
+    if (node->GetChildren()) {
+      node = node->GetChildren();
+      ++depth;
+      continue;
+    }
+    while (node && !node->GetNext()) {
+      node = node->GetParent();
+      --depth;
+    }
+    if (node) node = node->GetNext();
+  }
+  return deepest;
+}
+
+// A document the reader accepts nests within the bound: wx builds and frees
+// its tree by recursion, so the bound is what keeps the stack safe however
+// the acceptance was decided.
+void CheckLoadBounds() {
+  wxXmlDocument doc;
+  if (!LoadFolderConfig(wxString(kFolder) + "\\" + kSettingsDir + "\\folder.cfg", &doc)) return;
+  FUZZ_CHECK(Depth(doc.GetRoot()) <= kMaxConfigDepth);
+}
+
 // The store keeps its connection open from one call to the next. Asked to
 // disable a folder in a store that does not exist, it lets go of it: the
 // next run starts from a store that is not there, and each run frees what
@@ -145,6 +177,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const Situation situation = SituationFor(size);
   ResetInstallation(prefix, std::string(reinterpret_cast<const char*>(data), size), situation);
   const Tree before = Snapshot(prefix.root());
+  CheckLoadBounds();
 
   CHFMigrator engine;
   // The server's directory is found among the running processes; it does
