@@ -108,9 +108,11 @@ bool CHFMigrator::RegisterHotFolder() {
   if (!m_ImpositionProperties.Empty()) ConvertImposeSettings(impose);
   db::PreflightConfiguration preflight;
 
+  // Asked for before the move: it opens the store then, so that after the
+  // move only the store's own transaction remains.
+  RODuriZudaze& store = RODuriZudaze::GetInstance();
   Retirement retirement = RetireSettingsDirectory(paths);
-  bool registered = RODuriZudaze::GetInstance().CreateHotFolder(setting, folder, job, filter,
-                                                                impose, preflight) != 0;
+  bool registered = store.CreateHotFolder(setting, folder, job, filter, impose, preflight) != 0;
   // Nothing was created, so the legacy settings go back where a later run
   // finds them.
   if (!registered) RestoreSettingsDirectory(paths, retirement);

@@ -20,8 +20,16 @@ db::StoreLocation Location() {
 
 }  // namespace
 
+// The tool asks for the store just before it hands over a folder whose legacy
+// settings are already retired. Opening and checking the database here keeps
+// that hand-over down to its own transaction; a database that does not exist
+// yet is left for CreateHotFolder to make.
 RODuriZudaze& RODuriZudaze::GetInstance() {
   static RODuriZudaze store;
+  try {
+    Writer().OpenExisting(Location());
+  } catch (...) {
+  }
   return store;
 }
 

@@ -186,6 +186,10 @@ bool StoreWriter::Open(const StoreLocation& location, bool create) {
   return statements_->Prepare(db);
 }
 
+bool StoreWriter::OpenExisting(const StoreLocation& location) {
+  return EnsureOpen(location, /*create=*/false);
+}
+
 CreateResult StoreWriter::Create(const StoreLocation& location, const HotFolderRecords& records) {
   if (!EnsureOpen(location, /*create=*/true)) return CreateResult::kFailed;
   bool duplicate = false;

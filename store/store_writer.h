@@ -42,6 +42,9 @@ class StoreWriter {
   // or when the last call failed. A failure closes the connection so that
   // the next call starts afresh.
   CreateResult Create(const StoreLocation& location, const HotFolderRecords& records);
+  // Opens the database at `file` when it exists and is ours, creating
+  // nothing, so that the next Create is only its own transaction.
+  bool OpenExisting(const StoreLocation& location);
   // False for an unknown folder path as well as for a failure. A missing
   // database holds no folder, so it is not created for this.
   bool Disable(const StoreLocation& location, const wxString& folder_path);
