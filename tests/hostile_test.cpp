@@ -185,7 +185,8 @@ std::set<fs::path> ChangeableRoots(const Scene& scene) {
     wxString windows(folder.path.c_str(), wxConvISO8859_1);
     platform::HostPath host = platform::ToHostPath(windows.ToStdWstring());
     // A run moves settings directories, it creates no folders.
-    if (host.empty() || !fs::is_directory(host)) continue;
+    std::error_code ec;
+    if (host.empty() || !fs::is_directory(host, ec)) continue;
     fs::path dir = fs::weakly_canonical(fs::absolute(host));
     roots.insert(dir / kSettingsDir);
     roots.insert(dir / kRetiredDir);
@@ -407,6 +408,30 @@ std::vector<Case> Cases() {
        {"Success", kMissing, kMissing, kMissing, kMissing},
        {"D:\\Jobs\\CON"},
        {"Jobs/CON"}},
+      {"undecodable, overlong, rooted and share paths",
+       [](Scene& s) {
+         s.Config("Jobs/Ok", kPlainConfig);
+         s.List({{"D:\\Jobs\\\x81\x8D\x8F\x90\x9D", 2},
+                 {"D:\\Jobs\\\x01\x1F\x7F", 2},
+                 {"D:\\" + std::string(256, 'A'), 2},
+                 {"\\Jobs\\Ok", 2},
+                 {"\\\\server\\share\\Jobs\\Ok", 2},
+                 {"\\\\..\\..\\drive_d\\Jobs\\Ok", 2}});
+       },
+       {kMissing, kMissing, kMissing, kMissing, kMissing, kMissing}},
+      {"drive root",
+       [](Scene& s) {
+         s.Config("", kPlainConfig);
+         s.List({{"D:\\", 2}});
+       },
+       {"Success"},
+       {"D:\\"},
+       {""},
+       [](Scene&, const std::vector<StoredHotFolder>& stored) {
+         EXPECT_EQ(stored[0].setting.Name, "");
+         EXPECT_EQ(stored[0].folderConfiguration.WorkFolder,
+                   "D:\\\\[_KYR_HotFolder_]\\[WorkFolder]");
+       }},
       {"forward slashes",
        [](Scene& s) {
          s.Config("Jobs/Fwd", kPlainConfig);
