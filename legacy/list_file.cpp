@@ -90,6 +90,9 @@ bool CHFMigrator::ReadLegacyList() {
   wxString common_app_data(platform::CommonAppDataFolder());
   if (common_app_data.empty()) return false;
   wxString path = LegacyListPath(common_app_data);
+  // Opening a FIFO under that name would wait for a writer forever, and an
+  // unattended run must end: only a regular file can be the list.
+  if (!platform::FileExists(path.ToStdWstring())) return false;
   std::ifstream in(platform::ToHostPath(path.ToStdWstring()), std::ios::binary);
   if (!in) return false;
 

@@ -8,6 +8,7 @@
 #include <linux/fs.h>
 #include <sqlite3.h>
 #include <sys/ioctl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -373,6 +374,11 @@ std::vector<Case> Cases() {
        {"Success"},
        {"D:\\Jobs\\Whole"},
        {"Jobs/Whole"}},
+      {"list file is a FIFO",
+       [](Scene& s) {
+         fs::create_directories(LegacyListHostPath(s.prefix()).parent_path());
+         ASSERT_EQ(mkfifo(LegacyListHostPath(s.prefix()).c_str(), 0600), 0);
+       }},
       {"100,000 records",
        [many](Scene& s) {
          s.List(many);
@@ -450,6 +456,15 @@ std::vector<Case> Cases() {
                  {"D:\\Jobs\\DirConfig", 2}});
        },
        {kMissing, kMissing, kMissing}},
+      {"folder.cfg is a FIFO or a device",
+       [](Scene& s) {
+         fs::create_directories(s.D("Jobs/Fifo") / kSettingsDir);
+         ASSERT_EQ(mkfifo((s.D("Jobs/Fifo") / kSettingsDir / "folder.cfg").c_str(), 0600), 0);
+         fs::create_directories(s.D("Jobs/Zero") / kSettingsDir);
+         fs::create_symlink("/dev/zero", s.D("Jobs/Zero") / kSettingsDir / "folder.cfg");
+         s.List({{"D:\\Jobs\\Fifo", 2}, {"D:\\Jobs\\Zero", 2}});
+       },
+       {kMissing, kMissing}},
       {"listed twice",
        [](Scene& s) {
          s.Config("Jobs/Twice", kPlainConfig);
