@@ -138,6 +138,16 @@ bool ReadDatabase(const std::string& name, int flags, const wxString& shown,
       version = query.ColumnInt(0);
     }
   }
+  // A database without any table is a store whose first folder was never
+  // committed (the writer died before its schema transaction): it holds no
+  // hot folder, exactly as the writer treats it.
+  if (version == 0) {
+    db::Statement objects;
+    if (objects.Prepare(db.get(), "SELECT count(*) FROM sqlite_master") && objects.Step() &&
+        objects.ColumnInt(0) == 0) {
+      return true;
+    }
+  }
   if (version != db::kSchemaVersion) {
     *error = version < 0 ? "cannot read store " + shown + ": " +
                                wxString::FromUTF8(sqlite3_errmsg(db.get()))
