@@ -26,7 +26,9 @@ std::vector<std::filesystem::path> CorpusFiles() {
   return files;
 }
 
-TEST(FuzzCorpus, EveryInputKeepsTheProperties) {
+// HF_FUZZ_SUITE names the target, so that each target's corpus is a test of
+// its own.
+TEST(HF_FUZZ_SUITE, EveryInputKeepsTheProperties) {
   int argc = 0;
   char** argv = nullptr;
   LLVMFuzzerInitialize(&argc, &argv);
