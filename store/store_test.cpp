@@ -18,6 +18,7 @@
 
 #include "store/store.h"
 #include "store/store_reader.h"
+#include "tests/immutable.h"
 #include "tests/temp_prefix.h"
 
 extern char** environ;
@@ -358,21 +359,21 @@ TEST(Store, UnwritableOrLockedLocationFails) {
 }
 
 // Made by another process, so that this one opens it only once it is
-// read-only.
+// read-only. The immutable flag, since permission bits do not stop root.
 TEST(Store, ReadOnlyStoreFails) {
   TempPrefix prefix;
   pid_t pid = Spawn(BinDir() + "/store_crash_writer", {"0", "1"}, nullptr);
   int status = 0;
   ASSERT_EQ(waitpid(pid, &status, 0), pid);
   fs::path file = StoreFile(prefix);
-  chmod(file.c_str(), 0444);
-  chmod(file.parent_path().c_str(), 0555);
-  // Permissions mean nothing to a privileged user.
-  if (access(file.c_str(), W_OK) == 0) GTEST_SKIP() << "permissions are not enforced";
   std::string before = ReadBytes(file);
+  ASSERT_TRUE(SetImmutable(file, true) && SetImmutable(file.parent_path(), true))
+      << "the file system of the temporary directory has no immutable flag";
   Folder refused("D:\\Jobs\\C");
   EXPECT_EQ(refused.Create(), 0);
   EXPECT_FALSE(RODuriZudaze::GetInstance().DisableHotFolder("D:\\Crash\\0"));
+  SetImmutable(file.parent_path(), false);
+  SetImmutable(file, false);
   EXPECT_EQ(ReadBytes(file), before);
 }
 

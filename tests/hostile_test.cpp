@@ -27,6 +27,7 @@
 #include "platform/platform.h"
 #include "store/store.h"
 #include "store/store_reader.h"
+#include "tests/immutable.h"
 #include "tests/legacy_fixture.h"
 #include "tests/temp_prefix.h"
 
@@ -52,20 +53,6 @@ std::string ReadBytes(const fs::path& path) {
   in.seekg(0);
   in.read(bytes.data(), static_cast<std::streamsize>(bytes.size()));
   return bytes;
-}
-
-// Sets or clears the immutable flag, which stops even root from renaming
-// entries of a directory or writing a file. False where the file system has
-// no such flag.
-bool SetImmutable(const fs::path& path, bool on) {
-  int fd = open(path.c_str(), O_RDONLY | O_NONBLOCK);
-  if (fd < 0) return false;
-  int flags = 0;
-  bool ok = ioctl(fd, FS_IOC_GETFLAGS, &flags) == 0;
-  flags = on ? (flags | FS_IMMUTABLE_FL) : (flags & ~FS_IMMUTABLE_FL);
-  ok = ok && ioctl(fd, FS_IOC_SETFLAGS, &flags) == 0;
-  close(fd);
-  return ok;
 }
 
 fs::path StoreFile() {
