@@ -12,3 +12,4 @@ export ASAN_OPTIONS=detect_leaks=1:abort_on_error=0
 export UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1
 ctest --test-dir build --output-on-failure -j"$(nproc)"
 scripts/fuzz.sh
+scripts/test_win32.sh
