@@ -52,4 +52,31 @@ inline void WriteFolderConfig(const TempPrefix& prefix, const std::string& folde
   prefix.WriteFile(OnDriveD(prefix, folder_on_d) / "[_KYR_HotFolder_]" / "folder.cfg", xml);
 }
 
+// <d> elements nested `depth` deep around `inside`.
+inline std::string NestedXml(int depth, const std::string& inside = "") {
+  std::string xml;
+  xml.reserve(depth * 7u + inside.size());
+  for (int i = 0; i < depth; ++i) xml += "<d>";
+  xml += inside;
+  for (int i = 0; i < depth; ++i) xml += "</d>";
+  return xml;
+}
+
+// UTF-16LE with its byte order mark: the same markup, a NUL after each
+// ASCII byte.
+inline std::string Utf16LeWithBom(const std::string& ascii) {
+  std::string bytes("\xFF\xFE", 2);
+  for (char c : ascii) bytes += std::string{c, '\0'};
+  return bytes;
+}
+
+// A document around `inside` whose entity references expand to 70 MiB,
+// padded ahead of them to stay within expat's own amplification limit.
+inline std::string ExpandingXml(const std::string& inside = "") {
+  std::string xml = "<!DOCTYPE r [<!ENTITY e '" + std::string(64 * 1024, 'e') + "'>]><r>" + inside +
+                    "<!--" + std::string(1024 * 1024, 'p') + "-->";
+  for (int i = 0; i < 1100; ++i) xml += "&e;";
+  return xml + "</r>";
+}
+
 #endif  // HF_TESTS_LEGACY_FIXTURE_H_
