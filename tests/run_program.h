@@ -2,7 +2,9 @@
 #ifndef HF_TESTS_RUN_PROGRAM_H_
 #define HF_TESTS_RUN_PROGRAM_H_
 
+#include <signal.h>
 #include <spawn.h>
+#include <stdio.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -11,6 +13,8 @@
 #include <string>
 #include <thread>
 #include <vector>
+
+#include "platform/platform.h"
 
 extern char** environ;
 
@@ -21,7 +25,8 @@ inline std::string BinDir() {
 }
 
 // Starts a program with the current environment; answers its pid or -1.
-inline pid_t StartProgram(const std::string& path, const std::vector<std::string>& args = {}) {
+inline pid_t StartProgram(const std::string& path, const std::vector<std::string>& args = {},
+                          const posix_spawn_file_actions_t* actions = nullptr) {
   std::vector<char*> argv;
   std::string arg0 = path;
   argv.push_back(arg0.data());
@@ -29,7 +34,7 @@ inline pid_t StartProgram(const std::string& path, const std::vector<std::string
   for (std::string& a : copies) argv.push_back(a.data());
   argv.push_back(nullptr);
   pid_t pid = -1;
-  if (posix_spawnp(&pid, path.c_str(), nullptr, nullptr, argv.data(), environ) != 0) return -1;
+  if (posix_spawnp(&pid, path.c_str(), actions, nullptr, argv.data(), environ) != 0) return -1;
   return pid;
 }
 
@@ -51,9 +56,40 @@ inline RunResult RunProgram(const std::string& path, const std::vector<std::stri
   RunResult result;
   pid_t pid = StartProgram(path, args);
   if (pid > 0) result.status = WaitProgram(pid);
-  result.seconds =
-      std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  result.seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   return result;
+}
+
+// A finished run with what it wrote to standard output and error.
+struct CapturedRun {
+  int status = -1;
+  std::string out;
+  std::string err;
+};
+
+inline CapturedRun RunCaptured(const std::string& path, const std::vector<std::string>& args) {
+  CapturedRun run;
+  FILE* streams[2] = {tmpfile(), tmpfile()};  // files, so neither can fill and block the child
+  if (streams[0] && streams[1]) {
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_adddup2(&actions, fileno(streams[0]), 1);
+    posix_spawn_file_actions_adddup2(&actions, fileno(streams[1]), 2);
+    pid_t pid = StartProgram(path, args, &actions);
+    posix_spawn_file_actions_destroy(&actions);
+    if (pid > 0) run.status = WaitProgram(pid);
+    std::string* texts[2] = {&run.out, &run.err};
+    for (int i = 0; i < 2; ++i) {
+      rewind(streams[i]);
+      char buffer[4096];
+      for (size_t n; (n = fread(buffer, 1, sizeof buffer, streams[i])) > 0;)
+        texts[i]->append(buffer, n);
+    }
+  }
+  for (FILE* stream : streams) {
+    if (stream) fclose(stream);
+  }
+  return run;
 }
 
 // Polls `condition` every 20 ms for up to `timeout_ms`.
@@ -65,5 +101,23 @@ bool WaitFor(Condition condition, int timeout_ms = 5000) {
   }
   return condition();
 }
+
+// The hotfolder.exe stand-in, running until the scope ends, so that the tool
+// has no start-up wait.
+class RunningServer {
+ public:
+  RunningServer() : pid_(StartProgram(BinDir() + "/hotfolder.exe")) {
+    WaitFor([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); });
+  }
+  ~RunningServer() {
+    kill(pid_, SIGKILL);
+    WaitProgram(pid_);
+  }
+  RunningServer(const RunningServer&) = delete;
+  RunningServer& operator=(const RunningServer&) = delete;
+
+ private:
+  pid_t pid_;
+};
 
 #endif  // HF_TESTS_RUN_PROGRAM_H_

@@ -14,6 +14,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <optional>
 #include <string>
 #include <system_error>
@@ -65,6 +66,12 @@ class TempPrefix {
     std::filesystem::create_directories(host_path.parent_path());
     std::ofstream out(host_path, std::ios::binary | std::ios::trunc);
     out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+  }
+
+  // The whole content of a file; empty when it cannot be read.
+  static std::string ReadFile(const std::filesystem::path& host_path) {
+    std::ifstream in(host_path, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), {});
   }
 
  private:
