@@ -1,12 +1,14 @@
 #!/usr/bin/env bash
 # Installs the Debian packages the project builds and tests with, when any is
-# missing. Quiet when everything is there; safe to run again.
+# missing, together with any further packages named as arguments. Quiet when
+# everything is there; safe to run again.
 set -euo pipefail
 
 packages=(
   cmake make g++ pkg-config clang-14 libclang-rt-14-dev
   libwxgtk3.2-dev libsqlite3-dev nlohmann-json3-dev
   libgtest-dev libgmock-dev
+  "$@"
 )
 
 missing=()
