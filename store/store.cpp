@@ -1,5 +1,8 @@
 #include "store/store.h"
 
+#include <cstdlib>
+#include <string>
+
 #include "store/store_reader.h"
 #include "store/store_writer.h"
 
@@ -12,10 +15,28 @@ db::StoreWriter& Writer() {
   return writer;
 }
 
-// Looked up on every call: the prefix that maps the fixed location may
-// change between calls (tests switch it), and the writer reopens then.
-db::StoreLocation Location() {
-  return db::StoreLocation{StoreFolder(), StoreHostPath()};
+std::string EnvironmentValue(const char* name) {
+  const char* value = std::getenv(name);
+  return value == nullptr ? std::string() : std::string(value);
+}
+
+// Mapping the fixed location walks the prefix's directories, which cost more
+// than the rest of a call. The prefix may change between calls (tests switch
+// it), so the mapping is kept per prefix, and only while the writer holds
+// the store open: a store that is gone is looked for afresh, under whatever
+// names its directories now have.
+const db::StoreLocation& Location() {
+  static std::string prefix, home;
+  static db::StoreLocation location;
+  std::string current_prefix = EnvironmentValue("WINEPREFIX");
+  std::string current_home = EnvironmentValue("HOME");
+  if (!Writer().IsOpen() || location.file.empty() || current_prefix != prefix ||
+      current_home != home) {
+    location = db::StoreLocation{StoreFolder(), StoreHostPath()};
+    prefix = std::move(current_prefix);
+    home = std::move(current_home);
+  }
+  return location;
 }
 
 }  // namespace

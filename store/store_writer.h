@@ -48,6 +48,8 @@ class StoreWriter {
   // False for an unknown folder path as well as for a failure. A missing
   // database holds no folder, so it is not created for this.
   bool Disable(const StoreLocation& location, const wxString& folder_path);
+  // Whether a connection is open, as the last call left it.
+  bool IsOpen() const { return db_ != nullptr; }
 
  private:
   struct Statements;
