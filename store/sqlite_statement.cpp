@@ -25,12 +25,50 @@ bool Statement::Prepare(sqlite3* db, const std::string& sql) {
                             SQLITE_PREPARE_PERSISTENT, &stmt_, nullptr) == SQLITE_OK;
 }
 
+namespace {
+
+// The encoding wxString::utf8_str() gives, written out because its converter
+// and buffer cost more than the rest of a bind: code points past U+10FFFF
+// fail, and a UTF-16 surrogate is encoded as it stands, as wx does. Where
+// wchar_t is UTF-16 the conversion is left to wx.
+bool ToUtf8(const wxString& text, std::string* out) {
+  out->clear();
+  if (sizeof(wchar_t) != 4) {
+    wxScopedCharBuffer utf8 = text.utf8_str();
+    if (utf8.length() == 0 && !text.empty()) return false;
+    out->assign(utf8.data(), utf8.length());
+    return true;
+  }
+  for (wchar_t c : text.ToStdWstring()) {
+    std::uint32_t code = static_cast<std::uint32_t>(c);
+    if (code < 0x80) {
+      out->push_back(static_cast<char>(code));
+    } else if (code < 0x800) {
+      out->push_back(static_cast<char>(0xC0 | (code >> 6)));
+      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
+    } else if (code < 0x10000) {
+      out->push_back(static_cast<char>(0xE0 | (code >> 12)));
+      out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
+      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
+    } else if (code <= 0x10FFFF) {
+      out->push_back(static_cast<char>(0xF0 | (code >> 18)));
+      out->push_back(static_cast<char>(0x80 | ((code >> 12) & 0x3F)));
+      out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
+      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
+    } else {
+      return false;
+    }
+  }
+  return true;
+}
+
+}  // namespace
+
 bool Statement::BindText(int index, const wxString& text) {
   // The explicit length keeps an embedded NUL character. A string with no
   // UTF-8 form converts to nothing; storing that would lose the value.
-  wxScopedCharBuffer utf8 = text.utf8_str();
-  if (utf8.length() == 0 && !text.empty()) return false;
-  return sqlite3_bind_text64(stmt_, index, utf8.data(), utf8.length(), SQLITE_TRANSIENT,
+  if (!ToUtf8(text, &utf8_)) return false;
+  return sqlite3_bind_text64(stmt_, index, utf8_.data(), utf8_.size(), SQLITE_TRANSIENT,
                              SQLITE_UTF8) == SQLITE_OK;
 }
 

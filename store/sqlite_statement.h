@@ -59,6 +59,7 @@ class Statement {
   sqlite3_stmt* stmt_ = nullptr;
   bool failed_ = false;
   bool bad_text_ = false;
+  std::string utf8_;  // kept between binds so that a bind allocates nothing
 };
 
 }  // namespace db
