@@ -68,8 +68,11 @@ class TempPrefix {
     out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
   }
 
-  // The whole content of a file; empty when it cannot be read.
+  // The whole content of a regular file; empty for anything else, which
+  // might not end (a FIFO) or not read at all (a directory).
   static std::string ReadFile(const std::filesystem::path& host_path) {
+    std::error_code ignored;
+    if (!std::filesystem::is_regular_file(host_path, ignored)) return std::string();
     std::ifstream in(host_path, std::ios::binary);
     return std::string(std::istreambuf_iterator<char>(in), {});
   }
