@@ -11,6 +11,7 @@
 #include <string>
 
 #include "app/migrator.h"
+#include "convert/ascii_text.h"
 #include "convert/numbers.h"
 
 namespace {
@@ -87,7 +88,7 @@ const CodeTable kGangup = Table(kGangupRows, 0);
 
 int CodeOf(const CodeTable& table, const wxString& value) {
   for (std::size_t i = 0; i < table.count; ++i) {
-    if (value.CmpNoCase(table.rows[i].word) == 0) return table.rows[i].code;
+    if (value.CmpNoCase(AsciiText(table.rows[i].word)) == 0) return table.rows[i].code;
   }
   return table.otherwise;
 }
@@ -120,21 +121,25 @@ class ImposeWriter {
         di_(engine.m_ImposeDeliveryInfo),
         out_(out) {}
 
-  void Put(const wxString& keyword, const wxString& value) {
-    out_.insert({keyword, db::ImposeSettingEntry{keyword, value}});
+  // Keywords and keys are the table's ASCII texts (see AsciiText).
+  void Put(const char* keyword, const wxString& value) {
+    wxString key = AsciiText(keyword);
+    out_.insert({key, db::ImposeSettingEntry{key, value}});
   }
+  void Put(const char* keyword, const char* value) { Put(keyword, AsciiText(value)); }
 
   // Writers for a key that is present, whatever its value.
-  void Copy(const SettingsMap& from, const char* key, const wxString& keyword) {
-    if (const wxString* value = from.Find(key)) Put(keyword, *value);
+  void Copy(const SettingsMap& from, const char* key, const char* keyword) {
+    if (const wxString* value = from.Find(AsciiText(key))) Put(keyword, *value);
   }
-  void Code(const SettingsMap& from, const char* key, const wxString& keyword,
-            const CodeTable& table) {
-    if (const wxString* value = from.Find(key)) Put(keyword, Decimal(CodeOf(table, *value)));
+  void Code(const SettingsMap& from, const char* key, const char* keyword, const CodeTable& table) {
+    if (const wxString* value = from.Find(AsciiText(key))) {
+      Put(keyword, Decimal(CodeOf(table, *value)));
+    }
   }
 
-  static wxString Text(const SettingsMap& from, const wxString& key) {
-    const wxString* value = from.Find(key);
+  static wxString Text(const SettingsMap& from, const char* key) {
+    const wxString* value = from.Find(AsciiText(key));
     return value ? *value : wxString();
   }
 
@@ -166,7 +171,7 @@ void ImposeWriter::Marks() {
 void ImposeWriter::LayoutAndGaps(bool zero_margins) {
   wxString x = Text(ii_, "x");
   wxString y = Text(ii_, "y");
-  Put("QXImpLayout", x + " " + y);
+  Put("QXImpLayout", x + L" " + y);
 
   std::int32_t columns = ReadInt32(x);
   std::int32_t rows = ReadInt32(y);
@@ -175,9 +180,9 @@ void ImposeWriter::LayoutAndGaps(bool zero_margins) {
   const int count = zero_margins ? 10 : 5;
   wxString gaps;
   for (const char* direction : {"HorizontalGap", "VerticalGap"}) {
-    gaps += Decimal(count) + " ";
+    gaps += Decimal(count) + L" ";
     for (int i = 0; i < count; ++i) {
-      if (const wxString* gap = ii_.Find(direction + Decimal(i))) gaps += *gap + " ";
+      if (const wxString* gap = ii_.Find(AsciiText(direction) + Decimal(i))) gaps += *gap + L" ";
     }
   }
   Put("QXImpFdGaps", gaps);
@@ -185,7 +190,7 @@ void ImposeWriter::LayoutAndGaps(bool zero_margins) {
 
 void ImposeWriter::ScaleBleedCreep() {
   Code(ii_, "AutoScale", "QXImpAutoPScal", kAutoScale);
-  if (const wxString* scale = ii_.Find("ScaleFactor")) {
+  if (const wxString* scale = ii_.Find(AsciiText("ScaleFactor"))) {
     Put("QXImpPageScale", *scale);
     Put("QXImpFdPgScale", FixedPoint(*scale));
   }
@@ -193,15 +198,16 @@ void ImposeWriter::ScaleBleedCreep() {
 
   // An absent vertical bleed leaves its half empty, not "0": the second
   // field is the legacy text, and there is none.
-  if (const wxString* horizontal = ii_.Find("HorizontalBleed")) {
-    const wxString* vertical = ii_.Find("VerticalBleed");
-    Put("QXImpBleed", FixedPoint(*horizontal) + " " + (vertical ? FixedPoint(*vertical) : ""));
-    Put("QXImpFdBleed", *horizontal + " " + (vertical ? *vertical : ""));
+  if (const wxString* horizontal = ii_.Find(AsciiText("HorizontalBleed"))) {
+    const wxString* vertical = ii_.Find(AsciiText("VerticalBleed"));
+    Put("QXImpBleed",
+        FixedPoint(*horizontal) + L" " + (vertical ? FixedPoint(*vertical) : wxString()));
+    Put("QXImpFdBleed", *horizontal + L" " + (vertical ? *vertical : wxString()));
   }
-  if (const wxString* creep = ii_.Find("Creep")) {
+  if (const wxString* creep = ii_.Find(AsciiText("Creep"))) {
     wxString fixed = FixedPoint(*creep);
-    Put("QXImpCreeps", fixed + " " + fixed);
-    Put("QXImpFdCreeps", *creep + " " + *creep);
+    Put("QXImpCreeps", fixed + L" " + fixed);
+    Put("QXImpFdCreeps", *creep + L" " + *creep);
   }
   Copy(ii_, "CreepDirection", "QXImpCreepDir");
 }
@@ -236,7 +242,7 @@ void CHFMigrator::ConvertImposeSettings(db::ImposeConfiguration& impose) {
   w.Copy(w.ip_, "PageSize", "PageSize");
   w.Copy(w.ip_, "PageRegion", "PageRegion");
 
-  bool zero_margins = ImposeWriter::Text(w.ip_, "ZeroMarginsSupport").CmpNoCase("TRUE") == 0;
+  bool zero_margins = ImposeWriter::Text(w.ip_, "ZeroMarginsSupport").CmpNoCase(L"TRUE") == 0;
   w.LayoutAndGaps(zero_margins);
   w.ScaleBleedCreep();
   w.Code(w.ii_, "Watermarks", "QXImpWatermark", kWatermark);
@@ -244,7 +250,7 @@ void CHFMigrator::ConvertImposeSettings(db::ImposeConfiguration& impose) {
   // Only "1" is sent, as "True". "0" would pair with "False", but the
   // service never sent that entry, and a store without it already treats
   // the folder as having no zero margins; we add nothing it never received.
-  if (zero_margins && ImposeWriter::Text(w.ip_, "ZeroMargins") == "1") {
+  if (zero_margins && ImposeWriter::Text(w.ip_, "ZeroMargins") == L"1") {
     w.Put("QXImpZeroMargin", "True");
   }
   w.Put("QXImpFdValues", "1");

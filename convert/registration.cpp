@@ -34,8 +34,8 @@ bool ResolveCached(CHFMigrator& engine, const wxString& address, wxString* name)
 }
 
 void FillServer(CHFMigrator& engine, db::Setting* setting) {
-  setting->ServerAddr = engine.m_FolderSettings.GetOrInsert("ServerAddr");
-  setting->ServerName = engine.m_FolderSettings.GetOrInsert("ServerName");
+  setting->ServerAddr = engine.m_FolderSettings.GetOrInsert(L"ServerAddr");
+  setting->ServerName = engine.m_FolderSettings.GetOrInsert(L"ServerName");
   wxString resolved;
   if (!ResolveCached(engine, setting->ServerAddr, &resolved)) return;
   setting->ServerName = resolved;
@@ -47,14 +47,14 @@ db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterCha
   setting.Name = paths.name;
   setting.FolderPath = paths.full_path;
   setting.String1 = wxString();
-  setting.Queue = QueueWord(engine.m_FolderSettings.GetOrInsert("LogicalPrinter"));
+  setting.Queue = QueueWord(engine.m_FolderSettings.GetOrInsert(L"LogicalPrinter"));
   setting.Queue2 = setting.Queue;
   FillServer(engine, &setting);
   setting.Flag1 = true;
   setting.Flag2 = true;
   setting.Flag3 = true;
   setting.Flag4 = false;
-  setting.String3 = "10";
+  setting.String3 = L"10";
   setting.Filters = std::move(chain.entries);
   return setting;
 }
@@ -64,7 +64,7 @@ db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterCha
 db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
   db::JobConfiguration job;
   for (const SettingsMap::Entry& entry : driver_settings) {
-    wxString key = entry.first.IsSameAs("NumCopies", false) ? wxString("num copies") : entry.first;
+    wxString key = entry.first.IsSameAs(L"NumCopies", false) ? wxString(L"num copies") : entry.first;
     job.emplace(key, db::JobSettingEntry{entry.first, entry.second, wxString()});
   }
   return job;
@@ -73,9 +73,9 @@ db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
 }  // namespace
 
 wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier) {
-  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, "Filter");
-  filter->AddAttribute("name", identifier);
-  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, "UI");
+  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, L"Filter");
+  filter->AddAttribute(L"name", identifier);
+  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, L"UI");
   // AddChild walks to the end each time; inserting after the last child
   // keeps a large map linear.
   wxXmlNode* last = nullptr;
@@ -94,12 +94,12 @@ bool CHFMigrator::RegisterHotFolder() {
   // time in which the folder is neither legacy nor registered is only the
   // store's own call.
   FilterChain chain = BuildFilterChain(*this);
-  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert("HFFolderPath"));
+  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert(L"HFFolderPath"));
   db::Setting setting = MakeSetting(*this, paths, chain);
   db::FilterConfiguration filter;
   filter = *chain.root;
   db::FolderConfiguration folder;
-  folder.FolderPath = m_FolderSettings.GetOrInsert("HFFolderPath");
+  folder.FolderPath = m_FolderSettings.GetOrInsert(L"HFFolderPath");
   folder.WorkFolder = paths.work;
   folder.FailedFolder = paths.failed;
   folder.MoveFolder = paths.move;
