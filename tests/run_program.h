@@ -120,4 +120,17 @@ class RunningServer {
   pid_t pid_;
 };
 
+// The hotfolder.exe processes of this host, whoever started them.
+inline std::vector<platform::ProcessId> ServerProcesses() {
+  std::vector<platform::ProcessId> ids, servers;
+  platform::EnumerateProcesses(&ids);
+  for (platform::ProcessId id : ids) {
+    std::wstring base;
+    if (platform::QueryProcessModule(id, &base, nullptr) && base == L"hotfolder.exe") {
+      servers.push_back(id);
+    }
+  }
+  return servers;
+}
+
 #endif  // HF_TESTS_RUN_PROGRAM_H_

@@ -2,6 +2,7 @@
 // the exit status.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -40,8 +41,8 @@ std::vector<platform::ProcessId> Launched(const TempPrefix& prefix) {
 }
 
 bool ServerAlive(platform::ProcessId id) {
-  std::wstring base;
-  return platform::QueryProcessModule(id, &base, nullptr) && base == L"hotfolder.exe";
+  std::vector<platform::ProcessId> servers = ServerProcesses();
+  return std::find(servers.begin(), servers.end(), id) != servers.end();
 }
 
 TEST(Startup, RunningServerIsNeitherWaitedForNorStopped) {
