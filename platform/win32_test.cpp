@@ -5,15 +5,13 @@
 // value whether it is open.
 #include "platform/platform.h"
 
-#include <winsock2.h>
-
 #include <windows.h>
 
 #include <sddl.h>
 
-#include <functional>
-
 #include <gtest/gtest.h>
+
+#include "tests/host_env.h"
 
 namespace {
 
@@ -21,36 +19,61 @@ int OpenHandleCount() {
   int count = 0;
   DWORD flags = 0;
   for (ULONG_PTR value = 4; value < 0x4000; value += 4) {
-    if (GetHandleInformation(reinterpret_cast<HANDLE>(value), &flags)) ++count;
+    count += GetHandleInformation(reinterpret_cast<HANDLE>(value), &flags) ? 1 : 0;
   }
   return count;
 }
 
-// Calls `call` once to let the system load what it keeps for good, then
-// twice more, which must leave no handle open.
-void ExpectNoHandleLeft(const std::function<void()>& call) {
-  call();
-  const int before = OpenHandleCount();
-  call();
-  call();
-  EXPECT_EQ(before, OpenHandleCount());
-}
-
-std::wstring Unique(const std::wstring& stem) {
-  return stem + std::to_wstring(GetCurrentProcessId()) + L"-" + std::to_wstring(GetTickCount64());
-}
-
-TEST(Win32Mutex, ProbeNeedsFullAccessAndKeepsNothingOpen) {
-  const std::wstring name = Unique(L"hf-mutex-");
+// One of each: a mutex of another holder, a key under HKEY_LOCAL_MACHINE, the
+// server stand-in started here.
+TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
+  const std::wstring unique =
+      std::to_wstring(GetCurrentProcessId()) + L"-" + std::to_wstring(GetTickCount64());
+  const std::wstring name = L"hf-mutex-" + unique, key = L"SOFTWARE\\hf-test-" + unique;
   HANDLE held = CreateMutexW(nullptr, TRUE, name.c_str());
-  EXPECT_TRUE(platform::NamedMutexExists(name));
-  EXPECT_FALSE(platform::HoldNamedMutex(name)) << "held by another holder";
-  const std::wstring cut = name + std::wstring(1, L'\0') + L"more";
-  EXPECT_FALSE(platform::NamedMutexExists(cut)) << "a NUL must not shorten the name";
-  ExpectNoHandleLeft([&] { platform::NamedMutexExists(name); });
-  CloseHandle(held);
-  EXPECT_FALSE(platform::NamedMutexExists(name)) << "a probe kept the mutex alive";
+  HKEY created = nullptr;
+  ASSERT_EQ(RegCreateKeyW(HKEY_LOCAL_MACHINE, (key + L"\\Sub").c_str(), &created), ERROR_SUCCESS);
+  RegCloseKey(created);
+  std::wstring program = Environment("HF_BIN_DIR") + L"\\hotfolder.exe";
+  STARTUPINFOW startup = {};
+  startup.cb = sizeof(startup);
+  PROCESS_INFORMATION server = {};
+  ASSERT_TRUE(CreateProcessW(program.c_str(), &program[0], nullptr, nullptr, FALSE, 0, nullptr,
+                             nullptr, &startup, &server))
+      << "HF_BIN_DIR must name the directory of hotfolder.exe";
+  CloseHandle(server.hThread);
+  // Holding its mutex, it is past the start-up that lists its modules.
+  Eventually([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); });
 
+  // Each once to let the system load what it keeps for good, then twice more.
+  std::wstring base_name, file_name;
+  std::vector<platform::ProcessId> ids;
+  const std::function<bool()> calls[] = {
+      [] { return platform::LaunchDetached(L"hostname.exe"); },  // both handles of a start
+      [&] { return platform::NamedMutexExists(name); },
+      [&] { return platform::QueryProcessModule(server.dwProcessId, &base_name, &file_name); },
+      [&] { return platform::EnumerateProcesses(&ids); },
+      [&] { return platform::HklmKeyOpensForRead(key); },
+  };
+  for (const auto& call : calls) {
+    EXPECT_TRUE(call());
+    const int before = OpenHandleCount();
+    EXPECT_TRUE(call() && call());
+    EXPECT_EQ(before, OpenHandleCount()) << &call - calls;
+  }
+
+  const int before = OpenHandleCount();
+  EXPECT_TRUE(platform::TerminateProcess(server.dwProcessId));
+  EXPECT_EQ(before, OpenHandleCount());
+  DWORD exit_code = 1;
+  EXPECT_EQ(WaitForSingleObject(server.hProcess, 10000), WAIT_OBJECT_0);
+  EXPECT_TRUE(GetExitCodeProcess(server.hProcess, &exit_code) && exit_code == 0) << exit_code;
+  CloseHandle(server.hProcess);
+
+  EXPECT_FALSE(platform::HoldNamedMutex(name)) << "held by another holder";
+  EXPECT_FALSE(platform::NamedMutexExists(name + std::wstring(1, L'\0') + L"more"))
+      << "a NUL must not shorten the name";
+  CloseHandle(held);
   // A mutex that grants only waiting on it does not count as the server's.
   PSECURITY_DESCRIPTOR descriptor = nullptr;
   ASSERT_TRUE(ConvertStringSecurityDescriptorToSecurityDescriptorW(
@@ -61,65 +84,12 @@ TEST(Win32Mutex, ProbeNeedsFullAccessAndKeepsNothingOpen) {
   EXPECT_FALSE(platform::NamedMutexExists(name));
   CloseHandle(restricted);
   LocalFree(descriptor);
-}
 
-TEST(Win32Process, ServerIsQueriedAndEndedWithExitCodeZeroLeavingNoHandle) {
-  // A program that ends at once shows that both handles of a start are closed.
-  ExpectNoHandleLeft([] { EXPECT_TRUE(platform::LaunchDetached(L"hostname.exe")); });
+  // Cut at the NUL, the name would be the key, which exists.
+  EXPECT_FALSE(platform::HklmKeyOpensForRead(key + std::wstring(1, L'\0') + L"\\Missing"));
+  RegDeleteTreeW(HKEY_LOCAL_MACHINE, key.c_str());
 
-  const wchar_t* bin = _wgetenv(L"HF_BIN_DIR");
-  ASSERT_NE(bin, nullptr) << "HF_BIN_DIR must name the directory of hotfolder.exe";
-  std::wstring program = std::wstring(bin) + L"\\hotfolder.exe";
-  STARTUPINFOW startup = {};
-  startup.cb = sizeof(startup);
-  PROCESS_INFORMATION server = {};
-  ASSERT_TRUE(CreateProcessW(program.c_str(), &program[0], nullptr, nullptr, FALSE, 0, nullptr,
-                             nullptr, &startup, &server));
-  CloseHandle(server.hThread);
-  // Holding its mutex, it is past the start-up that lists its modules.
-  for (int i = 0; i < 500 && !platform::NamedMutexExists(L"KYR Dirorodiv - Server"); ++i) Sleep(20);
-
-  std::wstring base_name, file_name;
-  ExpectNoHandleLeft([&] {
-    EXPECT_TRUE(platform::QueryProcessModule(server.dwProcessId, &base_name, &file_name));
-  });
-  EXPECT_EQ(_wcsicmp(file_name.c_str(), program.c_str()), 0) << file_name.c_str();
-  std::vector<platform::ProcessId> ids;
-  ExpectNoHandleLeft([&] { EXPECT_TRUE(platform::EnumerateProcesses(&ids)); });
-
-  const int before = OpenHandleCount();
-  EXPECT_TRUE(platform::TerminateProcess(server.dwProcessId));
-  EXPECT_EQ(before, OpenHandleCount());
-  ASSERT_EQ(WaitForSingleObject(server.hProcess, 10000), WAIT_OBJECT_0);
-  DWORD exit_code = 1;
-  GetExitCodeProcess(server.hProcess, &exit_code);
-  CloseHandle(server.hProcess);
-  EXPECT_EQ(exit_code, 0u);
-}
-
-TEST(Win32Registry, KeyCreatedUnderHklmOpensForReadAndMissingDoesNot) {
-  const std::wstring parent = L"SOFTWARE\\" + Unique(L"hf-test-");
-  HKEY created = nullptr;
-  ASSERT_EQ(RegCreateKeyExW(HKEY_LOCAL_MACHINE, (parent + L"\\Sub").c_str(), 0, nullptr, 0,
-                            KEY_ALL_ACCESS, nullptr, &created, nullptr),
-            ERROR_SUCCESS);
-  RegCloseKey(created);
-  EXPECT_TRUE(platform::HklmKeyOpensForRead(parent));
-  EXPECT_TRUE(platform::HklmKeyOpensForRead(parent + L"\\Sub"));
-  EXPECT_FALSE(platform::HklmKeyOpensForRead(parent + L"\\Missing"));
-  EXPECT_FALSE(platform::HklmKeyOpensForRead(parent + std::wstring(1, L'\0') + L"\\Missing"));
-  ExpectNoHandleLeft([&] { platform::HklmKeyOpensForRead(parent); });
-  RegDeleteTreeW(HKEY_LOCAL_MACHINE, parent.c_str());
-  EXPECT_FALSE(platform::HklmKeyOpensForRead(parent));
-}
-
-TEST(Win32Paths, WindowsPathsNeedNoMappingAndProgramDataComesFromTheSystem) {
-  EXPECT_EQ(platform::ToHostPath(L"D:\\Jobs\\x"), L"D:\\Jobs\\x");
-  EXPECT_EQ(platform::FromHostPath(L"D:\\Jobs\\x"), L"D:\\Jobs\\x");
-  wchar_t expected[MAX_PATH] = {};
-  GetEnvironmentVariableW(L"ProgramData", expected, MAX_PATH);
-  EXPECT_EQ(platform::CommonAppDataFolder(), expected);
-  EXPECT_TRUE(platform::DirectoryExists(platform::CommonAppDataFolder()));
+  EXPECT_EQ(platform::CommonAppDataFolder(), Environment("ProgramData"));
 }
 
 }  // namespace

@@ -1,0 +1,50 @@
+// The environment and waiting, for tests that are built for Windows hosts as
+// well as POSIX ones (the platform tests).
+#ifndef HF_TESTS_HOST_ENV_H_
+#define HF_TESTS_HOST_ENV_H_
+
+#include <stdlib.h>
+
+#include <chrono>
+#include <cstring>
+#include <functional>
+#include <string>
+#include <thread>
+
+#include "platform/platform.h"
+
+// Separates the directories of the executable search path.
+#ifdef _WIN32
+inline const platform::HostPath kSearchPathSeparator = L";";
+#else
+inline const platform::HostPath kSearchPathSeparator = ":";
+#endif
+
+// A variable of the environment; empty when unset.
+inline platform::HostPath Environment(const char* name) {
+#ifdef _WIN32
+  const wchar_t* value = _wgetenv(std::wstring(name, name + std::strlen(name)).c_str());
+#else
+  const char* value = getenv(name);
+#endif
+  return value ? value : platform::HostPath();
+}
+
+inline void SetEnvironment(const char* name, const platform::HostPath& value) {
+#ifdef _WIN32
+  _wputenv_s(std::wstring(name, name + std::strlen(name)).c_str(), value.c_str());
+#else
+  setenv(name, value.c_str(), 1);
+#endif
+}
+
+// Polls a condition for up to ten seconds.
+inline bool Eventually(const std::function<bool()>& condition) {
+  for (int i = 0; i < 500; ++i) {
+    if (condition()) return true;
+    std::this_thread::sleep_for(std::chrono::milliseconds(20));
+  }
+  return condition();
+}
+
+#endif  // HF_TESTS_HOST_ENV_H_
