@@ -18,22 +18,20 @@ namespace {
 int OpenHandleCount() {
   int count = 0;
   DWORD flags = 0;
-  for (ULONG_PTR value = 4; value < 0x4000; value += 4) {
+  for (ULONG_PTR value = 4; value < 0x4000; value += 4)
     count += GetHandleInformation(reinterpret_cast<HANDLE>(value), &flags) ? 1 : 0;
-  }
   return count;
 }
 
 // One of each: a mutex of another holder, a key under HKEY_LOCAL_MACHINE, the
 // server stand-in started here.
 TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
-  const std::wstring unique =
-      std::to_wstring(GetCurrentProcessId()) + L"-" + std::to_wstring(GetTickCount64());
-  const std::wstring name = L"hf-mutex-" + unique, key = L"SOFTWARE\\hf-test-" + unique;
+  const auto id = std::to_wstring(GetCurrentProcessId()) + L"-" + std::to_wstring(GetTickCount64());
+  const std::wstring name = L"hf-mutex-" + id, key = L"SOFTWARE\\hf-test-" + id;
   HANDLE held = CreateMutexW(nullptr, TRUE, name.c_str());
-  HKEY created = nullptr;
-  ASSERT_EQ(RegCreateKeyW(HKEY_LOCAL_MACHINE, (key + L"\\Sub").c_str(), &created), ERROR_SUCCESS);
-  RegCloseKey(created);
+  // Creates the key and Sub with it, and keeps no handle.
+  ASSERT_EQ(RegSetKeyValueW(HKEY_LOCAL_MACHINE, (key + L"\\Sub").c_str(), nullptr, REG_SZ, L"", 2),
+            ERROR_SUCCESS);
   std::wstring program = Environment("HF_BIN_DIR") + L"\\hotfolder.exe";
   STARTUPINFOW startup = {};
   startup.cb = sizeof(startup);
@@ -71,8 +69,8 @@ TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
   CloseHandle(server.hProcess);
 
   EXPECT_FALSE(platform::HoldNamedMutex(name)) << "held by another holder";
-  EXPECT_FALSE(platform::NamedMutexExists(name + std::wstring(1, L'\0') + L"more"))
-      << "a NUL must not shorten the name";
+  // A NUL must not cut the name short to the held one's.
+  EXPECT_FALSE(platform::NamedMutexExists(name + std::wstring(1, L'\0') + L"more"));
   CloseHandle(held);
   // A mutex that grants only waiting on it does not count as the server's.
   PSECURITY_DESCRIPTOR descriptor = nullptr;

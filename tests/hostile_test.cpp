@@ -358,19 +358,13 @@ std::vector<Case> Cases() {
                [](Scene&) { return std::string(kPlainConfig).replace(100, 1, "\xC3\x28\xFF"); }),
       Migrated(
           "UTF-16 with byte-order mark",
-          [](Scene&) {  // little-endian, as the host
-            const std::u16string text =
-                u"\uFEFF<?xml version=\"1.0\" encoding=\"UTF-16\"?><C><DriverSettings>"
-                u"<NumCopies>6</NumCopies></DriverSettings></C>";
-            return std::string(reinterpret_cast<const char*>(text.data()), 2 * text.size());
+          [](Scene&) {
+            return Utf16LeWithBom(
+                "<?xml version=\"1.0\" encoding=\"UTF-16\"?><C><DriverSettings>"
+                "<NumCopies>6</NumCopies></DriverSettings></C>");
           },
           ExpectCopies("6")),
-      Migrated("nested a million deep",
-               [](Scene&) {
-                 std::string xml;
-                 for (int i = 0; i < 2000000; ++i) xml += i < 1000000 ? "<a>" : "</a>";
-                 return xml;
-               }),
+      Migrated("nested a million deep", [](Scene&) { return NestedXml(1000000); }),
       // A valid document whose size is all in one comment.
       Migrated("100 MB folder.cfg",
                [](Scene&) {
