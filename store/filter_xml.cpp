@@ -2,6 +2,8 @@
 
 #include <cstdint>
 
+#include "store/utf8.h"
+
 namespace db {
 
 namespace {
@@ -36,21 +38,7 @@ const char* Replace(wchar_t c, Escape escape) {
 
 bool AppendCodePoint(std::uint32_t code, std::string* out) {
   if (code > 0x10FFFF || (code >= 0xD800 && code <= 0xDFFF)) return false;
-  if (code < 0x80) {
-    out->push_back(static_cast<char>(code));
-  } else if (code < 0x800) {
-    out->push_back(static_cast<char>(0xC0 | (code >> 6)));
-    out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-  } else if (code < 0x10000) {
-    out->push_back(static_cast<char>(0xE0 | (code >> 12)));
-    out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
-    out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-  } else {
-    out->push_back(static_cast<char>(0xF0 | (code >> 18)));
-    out->push_back(static_cast<char>(0x80 | ((code >> 12) & 0x3F)));
-    out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
-    out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-  }
+  AppendUtf8(code, out);
   return true;
 }
 

@@ -1,5 +1,7 @@
 #include "store/sqlite_statement.h"
 
+#include "store/utf8.h"
+
 namespace db {
 
 Database OpenDatabase(const std::string& utf8_path, int flags, std::string* error) {
@@ -41,23 +43,8 @@ bool ToUtf8(const wxString& text, std::string* out) {
   }
   for (wchar_t c : text.ToStdWstring()) {
     std::uint32_t code = static_cast<std::uint32_t>(c);
-    if (code < 0x80) {
-      out->push_back(static_cast<char>(code));
-    } else if (code < 0x800) {
-      out->push_back(static_cast<char>(0xC0 | (code >> 6)));
-      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-    } else if (code < 0x10000) {
-      out->push_back(static_cast<char>(0xE0 | (code >> 12)));
-      out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
-      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-    } else if (code <= 0x10FFFF) {
-      out->push_back(static_cast<char>(0xF0 | (code >> 18)));
-      out->push_back(static_cast<char>(0x80 | ((code >> 12) & 0x3F)));
-      out->push_back(static_cast<char>(0x80 | ((code >> 6) & 0x3F)));
-      out->push_back(static_cast<char>(0x80 | (code & 0x3F)));
-    } else {
-      return false;
-    }
+    if (code > 0x10FFFF) return false;
+    AppendUtf8(code, out);
   }
   return true;
 }
