@@ -56,6 +56,11 @@ TEST(Startup, RunningServerIsNeitherWaitedForNorStopped) {
   EXPECT_LT(run.seconds, 5.0) << "no start-up wait when the server runs";
   EXPECT_TRUE(Launched(prefix).empty());
   EXPECT_TRUE(platform::NamedMutexExists(kServerMutex)) << "the running server was stopped";
+
+  // A second stand-in finds the mutex taken and leaves at once.
+  RunResult second = RunProgram(BinDir() + "/hotfolder.exe");
+  EXPECT_EQ(second.status, 1);
+  EXPECT_LT(second.seconds, 5.0);
 }
 
 // The only slow test: the fixed seven-second wait after launching.
