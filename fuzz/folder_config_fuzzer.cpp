@@ -167,15 +167,10 @@ void ReleaseStore(const TempPrefix& prefix) {
 
 }  // namespace
 
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-  UseMemoryTempDir();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const TempPrefix& prefix = Prefix();
   const Situation situation = SituationFor(size);
-  ResetInstallation(prefix, std::string(reinterpret_cast<const char*>(data), size), situation);
+  ResetInstallation(prefix, InputBytes(data, size), situation);
   const Tree before = Snapshot(prefix.root());
   CheckLoadBounds();
 

@@ -34,6 +34,11 @@ inline void UseMemoryTempDir() {
   if (access("/dev/shm", W_OK) == 0) setenv("TMPDIR", "/dev/shm", 1);
 }
 
+// The input as the bytes of a file.
+inline std::string InputBytes(const std::uint8_t* data, std::size_t size) {
+  return std::string(reinterpret_cast<const char*>(data), size);
+}
+
 // Wide text from bytes: UTF-8 where the bytes are UTF-8, and any other byte
 // b as the lone surrogate U+DC00+b, so that every input is some text and
 // broken code points reach the code under test too.

@@ -79,11 +79,6 @@ const TempPrefix& Prefix() {
 
 }  // namespace
 
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-  UseMemoryTempDir();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const std::string devices = Prefix().root().string() + "/dosdevices/";
   const std::wstring windows = WideFromBytes(data, size);
@@ -115,6 +110,6 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   }
 
   // Any host text at all, shown as a Windows path.
-  platform::FromHostPath(std::string(reinterpret_cast<const char*>(data), size));
+  platform::FromHostPath(InputBytes(data, size));
   return 0;
 }

@@ -22,15 +22,9 @@ std::size_t WholeRecords(std::size_t size) {
 
 }  // namespace
 
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-  UseMemoryTempDir();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   static TempPrefix prefix;
-  prefix.WriteFile(LegacyListHostPath(prefix),
-                   std::string(reinterpret_cast<const char*>(data), size));
+  prefix.WriteFile(LegacyListHostPath(prefix), InputBytes(data, size));
 
   CHFMigrator engine;
   bool read = engine.ReadLegacyList();

@@ -43,15 +43,9 @@ void CheckKey(const std::wstring& key) {
 
 }  // namespace
 
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-  UseMemoryTempDir();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   static TempPrefix prefix;
-  prefix.WriteFile(prefix.root() / "system.reg",
-                   std::string(reinterpret_cast<const char*>(data), size));
+  prefix.WriteFile(prefix.root() / "system.reg", InputBytes(data, size));
   // The empty subkey is HKEY_LOCAL_MACHINE itself, there whenever the hive is.
   FUZZ_CHECK(platform::HklmKeyOpensForRead(L""));
   for (const wchar_t* key : kKeys) CheckKey(key);
