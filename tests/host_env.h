@@ -7,7 +7,6 @@
 
 #include <chrono>
 #include <cstring>
-#include <functional>
 #include <string>
 #include <thread>
 
@@ -38,13 +37,20 @@ inline void SetEnvironment(const char* name, const platform::HostPath& value) {
 #endif
 }
 
-// Polls a condition for up to ten seconds.
-inline bool Eventually(const std::function<bool()>& condition) {
-  for (int i = 0; i < 500; ++i) {
+// Polls `condition` every 20 ms for up to `timeout_ms`.
+template <typename Condition>
+bool WaitFor(Condition condition, int timeout_ms = 10000) {
+  for (int waited = 0; waited < timeout_ms; waited += 20) {
     if (condition()) return true;
     std::this_thread::sleep_for(std::chrono::milliseconds(20));
   }
   return condition();
+}
+
+// The platform tests' name for the same wait.
+template <typename Condition>
+bool Eventually(Condition condition) {
+  return WaitFor(condition);
 }
 
 #endif  // HF_TESTS_HOST_ENV_H_

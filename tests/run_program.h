@@ -11,10 +11,10 @@
 #include <chrono>
 #include <cstdlib>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "platform/platform.h"
+#include "tests/host_env.h"
 
 extern char** environ;
 
@@ -90,16 +90,6 @@ inline CapturedRun RunCaptured(const std::string& path, const std::vector<std::s
     if (stream) fclose(stream);
   }
   return run;
-}
-
-// Polls `condition` every 20 ms for up to `timeout_ms`.
-template <typename Condition>
-bool WaitFor(Condition condition, int timeout_ms = 5000) {
-  for (int waited = 0; waited < timeout_ms; waited += 20) {
-    if (condition()) return true;
-    std::this_thread::sleep_for(std::chrono::milliseconds(20));
-  }
-  return condition();
 }
 
 // The hotfolder.exe stand-in, running until the scope ends, so that the tool
