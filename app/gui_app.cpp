@@ -5,31 +5,12 @@
 #include <wx/image.h>
 #endif
 
-#include <string>
-#include <vector>
-
 #include "platform/platform.h"
+#include "server/server_process.h"
 
 namespace {
 
-const wchar_t kServerExecutable[] = L"hotfolder.exe";
-const wchar_t kServerMutex[] = L"KYR Dirorodiv - Server";
 const int kStartupWaitSeconds = 7;
-
-// Ends the first process the platform lists whose executable is named
-// "hotfolder.exe" in any letter case and that can be opened. It need not be
-// the one this run launched: the server is known by name only.
-void StopServer() {
-  std::vector<platform::ProcessId> ids;
-  if (!platform::EnumerateProcesses(&ids)) return;
-  for (platform::ProcessId id : ids) {
-    std::wstring base_name;
-    if (!platform::QueryProcessModule(id, &base_name, nullptr)) continue;
-    if (wxString(base_name).CmpNoCase(kServerExecutable) != 0) continue;
-    platform::TerminateProcess(id);
-    return;
-  }
-}
 
 }  // namespace
 
@@ -54,7 +35,9 @@ bool CHFGuiApp::OnInit() {
   return false;
 }
 
-int CHFGuiApp::OnExit() { return 0; }
+int CHFGuiApp::OnExit() {
+  return 0;
+}
 
 #ifdef _WIN32
 wxIMPLEMENT_APP(CHFGuiApp);

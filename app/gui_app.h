@@ -7,7 +7,7 @@
 #include <wx/app.h>
 #include <wx/string.h>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 
 // A headless tool needs no display on POSIX hosts; on Windows it is the
 // GUI-subsystem application it always was.

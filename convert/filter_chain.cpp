@@ -1,40 +1,12 @@
 #include "convert/filter_chain.h"
 
 #include <cstddef>
-#include <cstring>
 
 #include "convert/ascii_text.h"
-#include "convert/registration.h"
 #include "convert/server_lookup.h"
+#include "engine/legacy_filters.h"
 
 namespace {
-
-using MapMember = SettingsMap CHFMigrator::*;
-
-struct LegacyFilter {
-  const char* enable_key;
-  MapMember settings;
-  const char* identifier;
-  const char* display_name;
-  bool suppresses_default_chain;
-};
-
-// In the order they are tested and appended.
-const LegacyFilter kLegacyFilters[] = {
-    {"EPS2PSFILTER", &CHFMigrator::m_Eps2PsFilterConv, "KYR.EPS.1", "EPS", true},
-    {"JPEG2PDF", &CHFMigrator::m_Jpeg2PdfConv, "KYR.JPEG.1", "JPEG", false},
-    {"TIFF2PDF", &CHFMigrator::m_Tiff2PdfConv, "KYR.TIFF.1", "TIFF", false},
-    {"PDF2PS", &CHFMigrator::m_PexFilterConv, "KYR.PDF.1", "PDF", true},
-    {"TIFFITFILTER", &CHFMigrator::m_TiffItFilterConv, "KYR.TIFFIT.1", "TIFFIT", true},
-    {"ONEBITTIFF", &CHFMigrator::m_OneBitTiffConv, "KYR.ONEBITTIFF.1", "1-Bit TIFF", true},
-    {"CTLWFILTER", &CHFMigrator::m_CtlwFilterConv, "KYR.CTLWtoPS.1", "CT/LW", true},
-    {"EXPORTPS", &CHFMigrator::m_ExportPsConv, "KYR.ExportPS.1", "ExportPS", true},
-    {"PEXFILTER", &CHFMigrator::m_PexFilterConv, "KYR.PDF.1", "PDF", true},
-    {"PDF2GO", &CHFMigrator::m_Pdf2GoConv, "KYR.PDF2GO.1", "PDF2GO", true},
-    {"MICROSOFT", &CHFMigrator::m_MsOffice, "KYR.MSOffice.1", "Microsoft", false},
-    {"DCS2FILTER", &CHFMigrator::m_Dcs2FilterConv, "KYR.DCS.1", "DCS", true},
-    {"XRX", &CHFMigrator::m_PexFilterConv, "KYR.XRX.1", "XRX", true},
-};
 
 struct FixedValue {
   const char* key;
@@ -96,7 +68,7 @@ static_assert(sizeof(kTiffFixedValues) / sizeof(kTiffFixedValues[0]) == 34,
               "the TIFF output filter has 34 fixed settings");
 
 struct DefaultFilter {
-  MapMember settings;
+  SettingsMember settings;
   const FixedValue* fixed_values;
   std::size_t fixed_count;
   const char* identifier;
@@ -136,22 +108,37 @@ void WriteFixedValues(CHFMigrator& engine, const DefaultFilter& filter) {
 
 }  // namespace
 
+wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier) {
+  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, L"Filter");
+  filter->AddAttribute(L"name", identifier);
+  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, L"UI");
+  // AddChild walks to the end each time; inserting after the last child
+  // keeps a large map linear.
+  wxXmlNode* last = nullptr;
+  for (const SettingsMap::Entry& entry : settings) {
+    auto* element = new wxXmlNode(wxXML_ELEMENT_NODE, entry.first);
+    element->AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(), entry.second));
+    ui->InsertChildAfter(element, last);
+    last = element;
+  }
+  filter->AddChild(ui);
+  return filter;
+}
+
 FilterChain BuildFilterChain(CHFMigrator& engine) {
   FilterChain chain;
   chain.root = std::make_unique<wxXmlNode>(wxXML_ELEMENT_NODE, "FilterSetting");
   bool default_chain = true;
-  bool legacy_tiff = false;
+  bool default_tiff = true;
   for (const LegacyFilter& filter : kLegacyFilters) {
-    if (engine.m_FilterEnable.GetOrInsert(AsciiText(filter.enable_key)) != wxS("1")) {
-      continue;
-    }
-    Append(&chain, engine.*filter.settings, filter.identifier, filter.display_name);
-    if (filter.suppresses_default_chain) default_chain = false;
-    if (std::strcmp(filter.enable_key, "TIFF2PDF") == 0) legacy_tiff = true;
+    if (engine.m_FilterEnable.GetOrInsert(filter.key) != wxS("1")) continue;
+    Append(&chain, engine.*filter.converted, filter.identifier, filter.display_name);
+    if (filter.default_chain == DefaultChain::kReplaced) default_chain = false;
+    if (filter.default_chain == DefaultChain::kKeptWithoutTiff) default_tiff = false;
   }
   if (!default_chain) return chain;
   for (const DefaultFilter& filter : kDefaultChain) {
-    if (filter.skipped_with_legacy_tiff && legacy_tiff) continue;
+    if (filter.skipped_with_legacy_tiff && !default_tiff) continue;
     WriteFixedValues(engine, filter);
     Append(&chain, engine.*filter.settings, filter.identifier, filter.display_name);
   }

@@ -8,7 +8,7 @@
 #include <memory>
 #include <vector>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "store/records.h"
 
 // The list the store shows and, in step with it, the "FilterSetting" tree
@@ -17,6 +17,11 @@ struct FilterChain {
   std::unique_ptr<wxXmlNode> root;
   std::vector<db::FilterEntry> entries;
 };
+
+// A new "Filter" element, name = identifier, holding one "UI" element with one
+// child per map entry (element named after the key, one text child holding
+// the value). The caller owns the result.
+wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier);
 
 // Reads the filter-enable map and the filters' settings maps. The default
 // chain writes its fixed values into the engine's maps first, where they

@@ -2,10 +2,10 @@
 
 #include <cmath>
 
-#include "app/migrator.h"
 #include "convert/ascii_text.h"
-#include "convert/numbers.h"
 #include "convert/server_lookup.h"
+#include "engine/legacy_filters.h"
+#include "engine/numbers.h"
 
 namespace {
 
@@ -71,52 +71,25 @@ void ApplyRule(const ConversionRow& row, const wxString& value, SettingsMap& out
 // Values that are not literal are read only here, when the setting is
 // written, so that a step with an empty legacy map neither inserts
 // "PEXFILTER" into the filter-enable map nor scans for the server.
-wxString FixedValue(CHFMigrator& m, const FixedSetting& setting) {
+wxString FixedValue(CHFMigrator& engine, const FixedSetting& setting) {
   switch (setting.source) {
     case FixedSource::kLiteral:
       return AsciiText(setting.value);
     case FixedSource::kPexFilterEnabled:
-      return m.m_FilterEnable.GetOrInsert(wxS("PEXFILTER")) == wxS("1") ? wxS("1") : wxS("0");
+      return engine.m_FilterEnable.GetOrInsert(wxS("PEXFILTER")) == wxS("1") ? wxS("1") : wxS("0");
     case FixedSource::kServerDirectory:
-      return CachedServerDirectory(m.m_ServerDirectory);
+      return CachedServerDirectory(engine.m_ServerDirectory);
     case FixedSource::kPrinterName: {
-      const wxString* name = m.m_FilterSettings.Find(wxS("PRINTERNAME"));
+      const wxString* name = engine.m_FilterSettings.Find(wxS("PRINTERNAME"));
       return name ? *name : AsciiText(setting.value);
     }
   }
   return wxString();
 }
 
-void WriteFixed(CHFMigrator& m, const std::vector<FixedSetting>& fixed, SettingsMap& out) {
-  for (const FixedSetting& setting : fixed) Set(out, setting.key, FixedValue(m, setting));
+void WriteFixed(CHFMigrator& engine, const std::vector<FixedSetting>& fixed, SettingsMap& out) {
+  for (const FixedSetting& setting : fixed) Set(out, setting.key, FixedValue(engine, setting));
 }
-
-// The legacy map each step reads and the converted map it writes, in the
-// order the steps run.
-struct StepMaps {
-  SettingsMap CHFMigrator::*legacy;
-  SettingsMap CHFMigrator::*converted;
-  ConversionStep (*table)();
-};
-
-const StepMaps kSteps[] = {
-    {&CHFMigrator::m_Eps2PsFilter, &CHFMigrator::m_Eps2PsFilterConv, EpsStep},
-    {&CHFMigrator::m_Jpeg2Pdf, &CHFMigrator::m_Jpeg2PdfConv, JpegStep},
-    {&CHFMigrator::m_Tiff2Pdf, &CHFMigrator::m_Tiff2PdfConv, TiffStep},
-    {&CHFMigrator::m_TiffItFilter, &CHFMigrator::m_TiffItFilterConv, TiffItStep},
-    {&CHFMigrator::m_OneBitTiff, &CHFMigrator::m_OneBitTiffConv, OneBitTiffStep},
-    {&CHFMigrator::m_CtlwFilter, &CHFMigrator::m_CtlwFilterConv, CtlwStep},
-    {&CHFMigrator::m_ExportPs, &CHFMigrator::m_ExportPsConv, ExportPsStep},
-    {&CHFMigrator::m_Pdf2Go, &CHFMigrator::m_Pdf2GoConv, ExportPsStep},
-    {&CHFMigrator::m_PexFilter, &CHFMigrator::m_PexFilterConv, PexFilterStep},
-};
-
-// The maps whose output "PDFCONVERSION" turns into PDF, in the order they
-// are switched. The other converted filters keep the output their step gave.
-SettingsMap CHFMigrator::*const kPdfConversionMaps[] = {
-    &CHFMigrator::m_CtlwFilterConv, &CHFMigrator::m_Eps2PsFilterConv, &CHFMigrator::m_Jpeg2PdfConv,
-    &CHFMigrator::m_Tiff2PdfConv,   &CHFMigrator::m_MsOffice,
-};
 
 }  // namespace
 
@@ -127,36 +100,33 @@ SettingsMap CHFMigrator::*const kPdfConversionMaps[] = {
 // therefore always wins, whatever order the legacy file listed them in, and
 // the converted keys come out in table order, which is also the order of the
 // filter's settings in the store.
-void RunConversionStep(CHFMigrator& migrator, const SettingsMap& legacy, const ConversionStep& step,
+void RunConversionStep(CHFMigrator& engine, const SettingsMap& legacy, const ConversionStep& step,
                        SettingsMap& converted) {
-  if (legacy.Empty()) return;
   for (const ConversionRow& row : step.rows) {
     if (const wxString* value = legacy.Find(AsciiText(row.legacy_key))) {
       ApplyRule(row, *value, converted);
     }
   }
-  WriteFixed(migrator, step.fixed, converted);
+  WriteFixed(engine, step.fixed, converted);
 }
 
-void ConvertFilterMaps(CHFMigrator& m) {
-  for (const StepMaps& step : kSteps) {
-    RunConversionStep(m, m.*step.legacy, step.table(), m.*step.converted);
+void CHFMigrator::ConvertFilterSettings() {
+  static const SettingsMap kNoSettings;
+  for (const LegacyFilter& filter : kLegacyFilters) {
+    const SettingsMap& legacy = filter.legacy ? this->*filter.legacy : kNoSettings;
+    if (filter.convert_when == ConvertWhen::kNever) continue;
+    if (filter.convert_when == ConvertWhen::kWithSettings && legacy.Empty()) continue;
+    RunConversionStep(*this, legacy, filter.step(), this->*filter.converted);
   }
-  WriteFixed(m, MsOfficeSettings(), m.m_MsOffice);
-  WriteFixed(m, DcsSettings(), m.m_Dcs2FilterConv);
-  m.ApplyPdfConversion();
-}
-
-bool CHFMigrator::ConvertFilterSettings() {
-  ConvertFilterMaps(*this);
-  return RegisterHotFolder();
+  ApplyPdfConversion();
 }
 
 void CHFMigrator::ApplyPdfConversion() {
   const wxString* switched = m_FilterSettings.Find(wxS("PDFCONVERSION"));
   if (!switched || *switched != wxS("1")) return;
-  for (SettingsMap CHFMigrator::*map : kPdfConversionMaps) {
-    Set(this->*map, "OUTPUTFILETYPEPDF", "1");
-    Set(this->*map, "OUTPUTFILETYPEPS", "0");
+  for (const LegacyFilter& filter : kLegacyFilters) {
+    if (!filter.pdf_switch) continue;
+    Set(this->*filter.converted, "OUTPUTFILETYPEPDF", "1");
+    Set(this->*filter.converted, "OUTPUTFILETYPEPS", "0");
   }
 }

@@ -9,7 +9,7 @@
 #include <sstream>
 #include <string>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "tests/cases.h"
 #include "tests/temp_prefix.h"
 
@@ -81,7 +81,7 @@ std::string Convert(const Step& step, const std::string& legacy, const std::stri
   Migrator m;
   Fill(m.*step.legacy, legacy);
   Fill(m.*step.converted, held);
-  ConvertFilterMaps(m);
+  m.ConvertFilterSettings();
   return Dump(m.*step.converted);
 }
 
@@ -115,7 +115,7 @@ TEST(FilterSettings, EveryRowOfEveryStep) {
   setlocale(LC_NUMERIC, "C");
   // Empty maps give nothing, and the switches are read only when converting.
   Migrator empty;
-  ConvertFilterMaps(empty);
+  empty.ConvertFilterSettings();
   for (const Step& step : steps) EXPECT_EQ(Dump(empty.*step.converted), "") << step.name;
   EXPECT_EQ(Dump(empty.m_FilterEnable) + Dump(empty.m_FilterSettings), "");
 }
@@ -131,7 +131,7 @@ TEST(FilterSettings, PdfSwitchAndForcedPdfxOnlyOnOne) {
     for (const Step& step : steps) Fill(m.*step.legacy, step.name == "EPS" ? "" : "U=1");
     if (!value.empty()) Fill(m.m_FilterSettings, "PDFCONVERSION=" + value);
     m.m_FilterEnable.GetOrInsert("PEXFILTER") = value;
-    ConvertFilterMaps(m);
+    m.ConvertFilterSettings();
     const bool on = value == "1";
     EXPECT_EQ(Dump(m.m_FilterSettings) + Dump(m.m_FilterEnable),
               (value.empty() ? "" : "PDFCONVERSION=" + value + ";") + "PEXFILTER=" + value + ";");
@@ -148,7 +148,7 @@ TEST(FilterSettings, PdfSwitchAndForcedPdfxOnlyOnOne) {
   }
   Migrator named;
   Fill(named.m_FilterSettings, "PRINTERNAME=Plotter 7");
-  ConvertFilterMaps(named);
+  named.ConvertFilterSettings();
   EXPECT_EQ(Dump(named.m_MsOffice), MsOffice("Plotter 7"));
 }
 

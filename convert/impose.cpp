@@ -10,9 +10,9 @@
 #include <cstdint>
 #include <string>
 
-#include "app/migrator.h"
 #include "convert/ascii_text.h"
-#include "convert/numbers.h"
+#include "engine/migrator.h"
+#include "engine/numbers.h"
 
 namespace {
 

@@ -4,8 +4,8 @@
 #include <sstream>
 #include <string>
 
-#include "app/migrator.h"
 #include "convert/templates.h"
+#include "engine/migrator.h"
 #include "tests/cases.h"
 #include "tests/temp_prefix.h"
 

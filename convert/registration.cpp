@@ -1,11 +1,10 @@
-#include "convert/registration.h"
-
+// Assembly of the store records of one hot folder and its registration.
 #include <wx/intl.h>
 
-#include "app/migrator.h"
 #include "convert/filter_chain.h"
 #include "convert/server_lookup.h"
 #include "convert/settings_dir.h"
+#include "engine/migrator.h"
 #include "store/store.h"
 
 namespace {
@@ -64,30 +63,14 @@ db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterCha
 db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
   db::JobConfiguration job;
   for (const SettingsMap::Entry& entry : driver_settings) {
-    wxString key = entry.first.IsSameAs(L"NumCopies", false) ? wxString(L"num copies") : entry.first;
+    wxString key =
+        entry.first.IsSameAs(L"NumCopies", false) ? wxString(L"num copies") : entry.first;
     job.emplace(key, db::JobSettingEntry{entry.first, entry.second, wxString()});
   }
   return job;
 }
 
 }  // namespace
-
-wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier) {
-  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, L"Filter");
-  filter->AddAttribute(L"name", identifier);
-  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, L"UI");
-  // AddChild walks to the end each time; inserting after the last child
-  // keeps a large map linear.
-  wxXmlNode* last = nullptr;
-  for (const SettingsMap::Entry& entry : settings) {
-    auto* element = new wxXmlNode(wxXML_ELEMENT_NODE, entry.first);
-    element->AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(), entry.second));
-    ui->InsertChildAfter(element, last);
-    last = element;
-  }
-  filter->AddChild(ui);
-  return filter;
-}
 
 bool CHFMigrator::RegisterHotFolder() {
   // Every record is complete before the settings directory moves, so the
@@ -119,11 +102,5 @@ bool CHFMigrator::RegisterHotFolder() {
   if (registered && !m_CurrentEnabled) {
     registered = RODuriZudaze::GetInstance().DisableHotFolder(setting.FolderPath);
   }
-
-  m_DriverSettings.Clear();
-  m_ImpositionProperties.Clear();
-  m_ImposeDeliveryInfo.Clear();
-  m_ImposeInfo.Clear();
-  m_ImposeInfoVDP.Clear();
   return registered;
 }

@@ -1,4 +1,5 @@
-#include "convert/registration.h"
+#include "convert/filter_chain.h"
+#include "server/server_process.h"
 
 #include <gtest/gtest.h>
 #include <wx/tokenzr.h>
@@ -8,9 +9,9 @@
 #include <tuple>
 #include <vector>
 
-#include "app/migrator.h"
 #include "convert/host_resolver.h"
 #include "convert/server_lookup.h"
+#include "engine/migrator.h"
 #include "store/store_reader.h"
 #include "tests/run_program.h"
 #include "tests/temp_prefix.h"
@@ -50,10 +51,6 @@ class RegistrationTest : public ::testing::Test {
   StoredHotFolder Register(bool expect_registered = true) {
     wxString path = engine_.m_FolderSettings.GetOrInsert("HFFolderPath");
     EXPECT_EQ(engine_.RegisterHotFolder(), expect_registered) << path;
-    for (const SettingsMap* map :
-         {&engine_.m_DriverSettings, &engine_.m_ImpositionProperties, &engine_.m_ImposeDeliveryInfo,
-          &engine_.m_ImposeInfo, &engine_.m_ImposeInfoVDP})
-      EXPECT_TRUE(map->Empty()) << path;
     std::vector<StoredHotFolder> folders;
     wxString error;
     EXPECT_TRUE(ReadStore(StoreHostPath(), &folders, &error)) << error;
@@ -210,7 +207,6 @@ TEST_F(RegistrationTest, StoreServerJobsAndSecondRegistration) {
   ASSERT_TRUE(SetFileAttributes(FromHostPath((folder / kSettingsDir).string()), attributes));
   engine_.m_ImpositionProperties.GetOrInsert("Template") = "ImposeTemplate.2";
   EXPECT_FALSE(engine_.RegisterHotFolder());
-  EXPECT_TRUE(engine_.m_ImpositionProperties.Empty());
   EXPECT_FALSE(fs::exists(folder / kRetiredDir));
   EXPECT_EQ(AttributesOf(folder / kSettingsDir), attributes);
   fs::remove(fs::path(StoreHostPath()));
@@ -242,21 +238,21 @@ TEST_F(RegistrationTest, StoreServerJobsAndSecondRegistration) {
 
 TEST_F(RegistrationTest, DirectoryOfTheRunningServer) {
   if (!ServerProcesses().empty()) GTEST_SKIP() << "another hotfolder.exe is running";
-  wxString directory = "unchanged";
-  FindServerDirectory(directory);
-  EXPECT_EQ(directory, "unchanged");
+  std::wstring directory = L"unchanged";
+  FindServerDirectory(&directory);
+  EXPECT_EQ(directory, L"unchanged");
   {
     RunningServer server;
     EXPECT_TRUE(WaitFor([&] {
-      FindServerDirectory(directory);
-      return directory != "unchanged";
+      FindServerDirectory(&directory);
+      return directory != L"unchanged";
     }));
     // The default chain's PDF filter reports errors into that directory.
     MakeFolder("Error");
     engine_.RegisterHotFolder();
   }
   wxString expected(FromHostPath(fs::canonical(BinDir()).string()));
-  EXPECT_EQ(directory, expected);
+  EXPECT_EQ(wxString(directory), expected);
   EXPECT_EQ(engine_.m_PexFilterConv.GetOrInsert("ERRORPATH"), expected);
 }
 

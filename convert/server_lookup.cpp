@@ -8,6 +8,7 @@
 
 #include "convert/host_resolver.h"
 #include "platform/platform.h"
+#include "server/server_process.h"
 
 namespace {
 
@@ -77,25 +78,11 @@ bool ResolveServerName(const wxString& address, wxString& name) {
   return ResolveServerNameWith(SystemHostResolver(), address, name);
 }
 
-void FindServerDirectory(wxString& directory) {
-  std::vector<platform::ProcessId> ids;
-  if (!platform::EnumerateProcesses(&ids) || ids.empty()) return;
-  for (platform::ProcessId id : ids) {
-    std::wstring base_name;
-    std::wstring file_name;
-    if (!platform::QueryProcessModule(id, &base_name, &file_name)) continue;
-    // Compared exactly: the server's module is called this and nothing else.
-    if (base_name != L"hotfolder.exe" || file_name.empty()) continue;
-    platform::RemoveFileSpec(&file_name);
-    directory = wxString(file_name);
-    return;
-  }
-}
-
 const wxString& CachedServerDirectory(std::optional<wxString>& cache) {
   if (!cache) {
-    cache.emplace();
-    FindServerDirectory(*cache);
+    std::wstring directory;
+    FindServerDirectory(&directory);
+    cache.emplace(directory);
   }
   return *cache;
 }

@@ -10,14 +10,10 @@
 // on false `name` is unchanged.
 bool ResolveServerName(const wxString& address, wxString& name);
 
-// Overwrites `directory` with the directory of the running "hotfolder.exe"
-// (no trailing separator); leaves it as it was when no server is found.
-void FindServerDirectory(wxString& directory);
-
-// The server directory, looked up once and then kept in `cache` for the rest
-// of the run (the engine's m_ServerDirectory): the server does not move while
-// the tool runs, and scanning every process once per folder would make a
-// large migration slow. Empty when the server is not running.
+// The server directory (server/server_process.h), looked up once and then kept in `cache` for the
+// rest of the run (the engine's m_ServerDirectory): the server does not move while the tool runs,
+// and scanning every process once per folder would make a large migration slow. Empty when the
+// server is not running.
 const wxString& CachedServerDirectory(std::optional<wxString>& cache);
 
 #endif  // HF_CONVERT_SERVER_LOOKUP_H_

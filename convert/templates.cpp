@@ -5,7 +5,7 @@
 
 #include <cstddef>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "platform/platform.h"
 
 namespace {

@@ -17,7 +17,7 @@
 #include <wx/sstream.h>
 #include <wx/xml/xml.h>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "fuzz/fuzz_support.h"
 #include "legacy/xml_load.h"
 #include "store/store.h"

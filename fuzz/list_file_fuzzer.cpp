@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <string>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "fuzz/fuzz_support.h"
 #include "tests/legacy_fixture.h"
 #include "tests/temp_prefix.h"

@@ -7,34 +7,23 @@
 #include <cstdint>
 #include <vector>
 
-#include "convert/numbers.h"
+#include "engine/legacy_filters.h"
+#include "engine/numbers.h"
 #include "legacy/xml_load.h"
 #include "platform/platform.h"
 
 namespace {
 
-using MapMember = SettingsMap CHFMigrator::*;
-
 // Names are wide, as the document's are: a narrow literal would pass through
 // the C library's multibyte conversion on every search, for every folder.
 struct Section {
   const wchar_t* name;
-  MapMember map;
+  SettingsMember map;
 };
 
 const Section kLeadingSections[] = {
     {L"FolderSettings", &CHFMigrator::m_FolderSettings},
     {L"FILTERSETTINGS", &CHFMigrator::m_FilterSettings},
-};
-
-// The filters with a settings section of their own; each also names its
-// entry in the filter-enable map.
-const Section kFilterSections[] = {
-    {L"ONEBITTIFF", &CHFMigrator::m_OneBitTiff}, {L"CTLWFILTER", &CHFMigrator::m_CtlwFilter},
-    {L"DCS2FILTER", &CHFMigrator::m_Dcs2Filter}, {L"EPS2PSFILTER", &CHFMigrator::m_Eps2PsFilter},
-    {L"EXPORTPS", &CHFMigrator::m_ExportPs},     {L"JPEG2PDF", &CHFMigrator::m_Jpeg2Pdf},
-    {L"PDF2GO", &CHFMigrator::m_Pdf2Go},         {L"PEXFILTER", &CHFMigrator::m_PexFilter},
-    {L"TIFF2PDF", &CHFMigrator::m_Tiff2Pdf},     {L"TIFFITFILTER", &CHFMigrator::m_TiffItFilter},
 };
 
 const Section kDriverSections[] = {
@@ -50,25 +39,6 @@ const Section kImposeSections[] = {
 };
 const wchar_t* const kImposeParts[] = {L"Layout", L"SheetSize", L"SheetMargin", L"PaperSize",
                                        L"PrinterMarks"};
-
-enum class LegacyFilter { kOffice, kPdf2Ps, kXrx };
-
-struct KnownIdentifier {
-  const wchar_t* text;
-  bool trim_trailing_space;  // compare after trailing white space is removed
-  LegacyFilter filter;
-};
-
-// The identifiers are compared exactly, trailing line feed included.
-const KnownIdentifier kKnownIdentifiers[] = {
-    {L"{8530FDC1-4FBB-4BD3-A116-33186DE16718}\n", false, LegacyFilter::kOffice},
-    {L"{728E7740-D6A7-4D5D-8A68-98DDF21E4132}\n", false, LegacyFilter::kOffice},
-    {L"{AE31FFA3-8524-4734-B35D-E6DB6FE9A371}\n", false, LegacyFilter::kOffice},
-    {L"{68FC3B4A-62B7-11D6-99CD-00E08101E712}\n", false, LegacyFilter::kOffice},
-    {L"{CDD70909-DACE-499B-9186-B6088CD46376}\n", false, LegacyFilter::kPdf2Ps},
-    {L"{02AC69D4-CAEE-47E1-912E-95B0C9E8D86A}\n", false, LegacyFilter::kXrx},
-    {L"63EE9F15-C7B1-43C8-9958-E9EFE972EA00", true, LegacyFilter::kXrx},
-};
 
 // Comments and processing instructions do not count where a node is located
 // by position: a note added to a folder.cfg by hand must not shift which
@@ -92,12 +62,20 @@ bool ContainerEnableText(const wxXmlNode* container, wxString* text) {
   return true;
 }
 
-const LegacyFilter* IdentifyFilter(const wxString& identifier) {
-  wxString trimmed = wxString(identifier).Trim(true);
-  for (const KnownIdentifier& known : kKnownIdentifiers) {
-    if ((known.trim_trailing_space ? trimmed : identifier) == known.text) return &known.filter;
+bool Matches(const LegacyIdentifier* ids, const wxString& identifier, const wxString& trimmed) {
+  for (; ids && ids->text; ++ids) {
+    if ((ids->trim_trailing_space ? trimmed : identifier) == ids->text) return true;
   }
-  return nullptr;
+  return false;
+}
+
+// The index of the filter known by `identifier`, or the table's size.
+std::size_t IdentifyFilter(const wxString& identifier) {
+  wxString trimmed = wxString(identifier).Trim(true);
+  std::size_t i = 0;
+  while (i < kLegacyFilters.size() && !Matches(kLegacyFilters[i].legacy_ids, identifier, trimmed))
+    ++i;
+  return i;
 }
 
 wxString Flag(bool on) {
@@ -108,37 +86,36 @@ wxString Flag(bool on) {
 // text when it has none; a text taken for another filter could switch on a
 // filter the folder does not have.
 void ReadFilterSections(CHFMigrator& engine, wxXmlNode* root) {
-  for (const Section& filter : kFilterSections) {
-    wxXmlNode* section = FindElement(root, filter.name);
-    ReadSection(section, engine.*filter.map);
+  for (const LegacyFilter& filter : kLegacyFilters) {
+    if (filter.enabled_by != EnabledBy::kSection) continue;
+    wxXmlNode* section = FindElement(root, filter.key);
+    ReadSection(section, engine.*filter.legacy);
     wxString enable;
     if (section) ContainerEnableText(section->GetParent(), &enable);
-    engine.m_FilterEnable.GetOrInsert(filter.name) = enable;
+    engine.m_FilterEnable.GetOrInsert(filter.key) = enable;
   }
 }
 
 // The containers without a settings section are known by identifier only.
 void ReadFilterContainers(CHFMigrator& engine, wxXmlNode* root) {
-  std::int64_t office_count = 0;  // a sum of 32-bit terms cannot overflow it
+  // A sum of 32-bit terms cannot overflow these.
+  std::vector<std::int64_t> counts(kLegacyFilters.size(), 0);
   for (const wxXmlNode* node = FindElement(root, wxS("FILTERID")); node; node = node->GetNext()) {
     const wxXmlNode* first = NthChild(node, 0);
     wxString enable;
     if (!first || !ContainerEnableText(node, &enable)) continue;
-    const LegacyFilter* filter = IdentifyFilter(first->GetContent());
-    if (!filter) continue;
-    switch (*filter) {
-      case LegacyFilter::kOffice:
-        office_count += ReadInt32(enable);  // no leading number counts 0
-        break;
-      case LegacyFilter::kPdf2Ps:
-        engine.m_FilterEnable.GetOrInsert(wxS("PDF2PS")) = Flag(enable == wxS("1"));
-        break;
-      case LegacyFilter::kXrx:
-        engine.m_FilterEnable.GetOrInsert(wxS("XRX")) = Flag(enable == wxS("1"));
-        break;
+    std::size_t i = IdentifyFilter(first->GetContent());
+    if (i == kLegacyFilters.size()) continue;
+    if (kLegacyFilters[i].enabled_by == EnabledBy::kCount) {
+      counts[i] += ReadInt32(enable);  // no leading number counts 0
+    } else {
+      engine.m_FilterEnable.GetOrInsert(kLegacyFilters[i].key) = Flag(enable == wxS("1"));
     }
   }
-  engine.m_FilterEnable.GetOrInsert(wxS("MICROSOFT")) = Flag(office_count > 0);
+  for (std::size_t i = 0; i < kLegacyFilters.size(); ++i) {
+    if (kLegacyFilters[i].enabled_by != EnabledBy::kCount) continue;
+    engine.m_FilterEnable.GetOrInsert(kLegacyFilters[i].key) = Flag(counts[i] > 0);
+  }
 }
 
 void ReadImposeSection(wxXmlNode* root, const wchar_t* name, SettingsMap& map) {
@@ -217,17 +194,4 @@ bool ReadFolderConfiguration(CHFMigrator& engine, std::size_t index) {
       index < engine.m_EnabledFlags.size() && engine.m_EnabledFlags[index] == wxS("0");
   engine.m_CurrentEnabled = !listed_disabled;
   return true;
-}
-
-void CHFMigrator::MigrateFolders() {
-  // One outcome per folder: room for all of them at once, rather than
-  // copies of every outcome so far each time the list grows.
-  m_Status.Alloc(m_Status.size() + m_Folders.size());
-  for (std::size_t i = 0; i < m_Folders.size(); ++i) {
-    if (!ReadFolderConfiguration(*this, i)) {
-      m_Status.Add("Failed; File missing");
-      continue;
-    }
-    m_Status.Add(ConvertFilterSettings() ? "Success" : "Unknown error");
-  }
 }

@@ -1,5 +1,4 @@
-// Reading one legacy folder's folder.cfg into the engine's settings maps,
-// and the per-folder loop that hands each folder to conversion.
+// Reading one legacy folder's folder.cfg into the engine's settings maps.
 #ifndef HF_LEGACY_FOLDER_READER_H_
 #define HF_LEGACY_FOLDER_READER_H_
 
@@ -8,8 +7,7 @@
 
 #include <cstddef>
 
-#include "app/migrator.h"
-#include "app/settings_map.h"
+#include "engine/migrator.h"
 
 // The first element named `name` below `start` (never `start` itself): a
 // direct child of `start` wins; failing that, the first child subtree in

@@ -8,7 +8,7 @@
 #include <cstring>
 #include <fstream>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "legacy/cp1252.h"
 #include "platform/platform.h"
 

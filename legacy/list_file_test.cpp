@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "tests/legacy_fixture.h"
 
 namespace {

@@ -5,8 +5,9 @@
 #include <thread>
 
 #include "platform/platform.h"
+#include "server/server_process.h"
 
 int main() {
-  if (!platform::HoldNamedMutex(L"KYR Dirorodiv - Server")) return 1;
+  if (!platform::HoldNamedMutex(kServerMutex)) return 1;
   for (;;) std::this_thread::sleep_for(std::chrono::hours(1));
 }

@@ -17,7 +17,7 @@
 #include <set>
 #include <tuple>
 
-#include "app/migrator.h"
+#include "engine/migrator.h"
 #include "platform/platform.h"
 #include "store/store.h"
 #include "store/store_reader.h"

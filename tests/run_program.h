@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "platform/platform.h"
+#include "server/server_process.h"
 #include "tests/host_env.h"
 
 extern char** environ;
@@ -97,7 +98,7 @@ inline CapturedRun RunCaptured(const std::string& path, const std::vector<std::s
 class RunningServer {
  public:
   RunningServer() : pid_(StartProgram(BinDir() + "/hotfolder.exe")) {
-    WaitFor([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); });
+    WaitFor([] { return platform::NamedMutexExists(kServerMutex); });
   }
   ~RunningServer() {
     kill(pid_, SIGKILL);
@@ -116,7 +117,7 @@ inline std::vector<platform::ProcessId> ServerProcesses() {
   platform::EnumerateProcesses(&ids);
   for (platform::ProcessId id : ids) {
     std::wstring base;
-    if (platform::QueryProcessModule(id, &base, nullptr) && base == L"hotfolder.exe") {
+    if (platform::QueryProcessModule(id, &base, nullptr) && base == kServerExecutable) {
       servers.push_back(id);
     }
   }

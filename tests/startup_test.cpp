@@ -15,8 +15,6 @@
 
 namespace {
 
-const wchar_t kServerMutex[] = L"KYR Dirorodiv - Server";
-
 // Puts first on PATH a "hotfolder.exe" that logs its process id in the prefix
 // and then becomes the real stand-in under that id (same module name, so the
 // tool can find and stop it); PATH comes back afterwards.

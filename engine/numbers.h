@@ -3,8 +3,8 @@
 // The legacy files were written with a point as the decimal separator, and
 // the store expects one, so neither reading nor printing may follow the
 // host's LC_NUMERIC: these helpers always use the "C" conventions.
-#ifndef HF_CONVERT_NUMBERS_H_
-#define HF_CONVERT_NUMBERS_H_
+#ifndef HF_ENGINE_NUMBERS_H_
+#define HF_ENGINE_NUMBERS_H_
 
 #include <wx/string.h>
 
@@ -25,4 +25,4 @@ std::int32_t ReadInt32(const wxString& text);
 // Prints a number as printf's "%f": fixed-point, six digits after a point.
 wxString FormatFixed(double value);
 
-#endif  // HF_CONVERT_NUMBERS_H_
+#endif  // HF_ENGINE_NUMBERS_H_

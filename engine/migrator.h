@@ -1,10 +1,11 @@
 // CHFMigrator: the migration engine. It holds everything one run works on:
 // the legacy folder list, one outcome per folder, and the settings maps that
 // are the interface between reading, conversion and registration. Its
-// operations are spread over the subsystems that own them (legacy/,
-// convert/); they reach the members directly.
-#ifndef HF_APP_MIGRATOR_H_
-#define HF_APP_MIGRATOR_H_
+// operations are defined by the subsystems that own them (app/ the run's
+// order, legacy/ the list file, convert/ conversion and registration); they
+// reach the members directly.
+#ifndef HF_ENGINE_MIGRATOR_H_
+#define HF_ENGINE_MIGRATOR_H_
 
 #include <wx/arrstr.h>
 #include <wx/string.h>
@@ -13,23 +14,23 @@
 #include <optional>
 #include <utility>
 
-#include "app/settings_map.h"
+#include "engine/settings_map.h"
 #include "store/records.h"
 
 class CHFMigrator {
  public:
   CHFMigrator() = default;
 
-  // The whole migration: ReadLegacyList, then MigrateFolders. Answers what
-  // ReadLegacyList answered.
+  // app/run.cpp: the whole migration, ReadLegacyList then MigrateFolders,
+  // answering what ReadLegacyList answered; and the per-folder loop.
   bool Run();
+  void MigrateFolders();
 
   // legacy/list_file.cpp
   bool ReadLegacyList();
-  // legacy/folder_reader.cpp
-  void MigrateFolders();
-  // convert/filter_settings.cpp
-  bool ConvertFilterSettings();
+  // convert/filter_settings.cpp: the legacy filters' settings into their
+  // converted maps, then the PDF switch.
+  void ConvertFilterSettings();
   void ApplyPdfConversion();
   // convert/registration.cpp
   bool RegisterHotFolder();
@@ -42,6 +43,9 @@ class CHFMigrator {
   // Empties every settings map. Called before each folder is read, so that
   // nothing of one folder reaches the next.
   void ClearSettingsMaps();
+  // Empties the driver and imposition maps, as every folder's registration
+  // leaves them.
+  void ClearDriverAndImposeMaps();
 
   wxArrayString m_Folders;       // legacy folder paths, in list-file order
   wxArrayString m_Status;        // one outcome text per folder
@@ -89,4 +93,4 @@ class CHFMigrator {
   std::map<wxString, std::pair<bool, wxString>> m_ResolvedNames;
 };
 
-#endif  // HF_APP_MIGRATOR_H_
+#endif  // HF_ENGINE_MIGRATOR_H_

@@ -8,8 +8,8 @@
 //   iteration    visits every entry once, in the order the keys were first
 //                inserted. That order is ours to choose; insertion order makes
 //                every run, and every filter's "UI" element, come out the same.
-#ifndef HF_APP_SETTINGS_MAP_H_
-#define HF_APP_SETTINGS_MAP_H_
+#ifndef HF_ENGINE_SETTINGS_MAP_H_
+#define HF_ENGINE_SETTINGS_MAP_H_
 
 #include <wx/hashmap.h>
 #include <wx/string.h>
@@ -54,4 +54,4 @@ class SettingsMap {
   std::unordered_map<wxString, std::size_t, wxStringHash, wxStringEqual> index_;
 };
 
-#endif  // HF_APP_SETTINGS_MAP_H_
+#endif  // HF_ENGINE_SETTINGS_MAP_H_

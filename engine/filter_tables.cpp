@@ -1,4 +1,4 @@
-#include "convert/filter_tables.h"
+#include "engine/filter_tables.h"
 
 #include <cstddef>
 
@@ -215,14 +215,11 @@ ConversionStep PexFilterStep() {
   return {AsVector(kPexFilterRows), AsVector(kPexFilterFixed)};
 }
 
-const std::vector<FixedSetting>& MsOfficeSettings() {
-  static const std::vector<FixedSetting> settings = AsVector(kMsOfficeFixed);
-  return settings;
+ConversionStep MsOfficeStep() {
+  return {{}, AsVector(kMsOfficeFixed)};
 }
-
-const std::vector<FixedSetting>& DcsSettings() {
-  static const std::vector<FixedSetting> settings = AsVector(kDcsFixed);
-  return settings;
+ConversionStep DcsStep() {
+  return {{}, AsVector(kDcsFixed)};
 }
 
 const char* ImagePositionText(const wxString& legacy) {

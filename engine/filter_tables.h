@@ -2,8 +2,8 @@
 // becomes which new key by which rule, and which settings each converted
 // filter always receives. They are data rather than code so that every row
 // can be checked against the legacy filter's documentation one by one.
-#ifndef HF_CONVERT_FILTER_TABLES_H_
-#define HF_CONVERT_FILTER_TABLES_H_
+#ifndef HF_ENGINE_FILTER_TABLES_H_
+#define HF_ENGINE_FILTER_TABLES_H_
 
 #include <wx/string.h>
 
@@ -65,12 +65,12 @@ ConversionStep CtlwStep();
 ConversionStep ExportPsStep();  // EXPORTPS and PDF2GO alike
 ConversionStep PexFilterStep();
 
-// Written on every folder, whatever the legacy maps hold.
-const std::vector<FixedSetting>& MsOfficeSettings();
-const std::vector<FixedSetting>& DcsSettings();
+// Fixed settings only, written on every folder whatever the legacy maps hold.
+ConversionStep MsOfficeStep();
+ConversionStep DcsStep();
 
 // The text of a legacy "IMAGEPOSITION" digit; nullptr for a value that is
 // not a known position, which then writes nothing.
 const char* ImagePositionText(const wxString& legacy);
 
-#endif  // HF_CONVERT_FILTER_TABLES_H_
+#endif  // HF_ENGINE_FILTER_TABLES_H_

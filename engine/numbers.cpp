@@ -1,25 +1,37 @@
-#include "convert/numbers.h"
+#include "engine/numbers.h"
 
 #include <stdlib.h>
 
+#include <locale.h>
 #include <cerrno>
 #include <charconv>
 #include <climits>
-#include <locale.h>
 #include <string>
 
 namespace {
 
 #ifdef _WIN32
 using CLocale = _locale_t;
-CLocale MakeCLocale() { return _create_locale(LC_ALL, "C"); }
-double StrtodC(const char* s, char** end, CLocale l) { return _strtod_l(s, end, l); }
-long long StrtollC(const char* s, char** end, CLocale l) { return _strtoi64_l(s, end, 10, l); }
+CLocale MakeCLocale() {
+  return _create_locale(LC_ALL, "C");
+}
+double StrtodC(const char* s, char** end, CLocale l) {
+  return _strtod_l(s, end, l);
+}
+long long StrtollC(const char* s, char** end, CLocale l) {
+  return _strtoi64_l(s, end, 10, l);
+}
 #else
 using CLocale = locale_t;
-CLocale MakeCLocale() { return newlocale(LC_ALL_MASK, "C", static_cast<locale_t>(0)); }
-double StrtodC(const char* s, char** end, CLocale l) { return strtod_l(s, end, l); }
-long long StrtollC(const char* s, char** end, CLocale l) { return strtoll_l(s, end, 10, l); }
+CLocale MakeCLocale() {
+  return newlocale(LC_ALL_MASK, "C", static_cast<locale_t>(0));
+}
+double StrtodC(const char* s, char** end, CLocale l) {
+  return strtod_l(s, end, l);
+}
+long long StrtollC(const char* s, char** end, CLocale l) {
+  return strtoll_l(s, end, 10, l);
+}
 #endif
 
 CLocale TheCLocale() {
@@ -32,7 +44,8 @@ CLocale TheCLocale() {
 std::string Narrow(const wxString& text) {
   std::string out;
   out.reserve(text.length());
-  for (wxUniChar c : text) out.push_back(c.GetValue() < 0x80 ? static_cast<char>(c.GetValue()) : '?');
+  for (wxUniChar c : text)
+    out.push_back(c.GetValue() < 0x80 ? static_cast<char>(c.GetValue()) : '?');
   return out;
 }
 
