@@ -1,9 +1,6 @@
 #include "app/gui_app.h"
 
 #include <wx/utils.h>
-#ifdef _WIN32
-#include <wx/image.h>
-#endif
 
 #include "platform/platform.h"
 #include "server/server_process.h"
@@ -25,11 +22,6 @@ bool CHFGuiApp::OnInit() {
     wxSleep(kStartupWaitSeconds);
     started_by_us = true;
   }
-  // Image handlers belong to the GUI core and no image is ever loaded in a
-  // run, so a headless build does without registering them.
-#ifdef _WIN32
-  wxInitAllImageHandlers();
-#endif
   m_Engine.Run();
   if (started_by_us) StopServer();
   return false;
@@ -39,8 +31,4 @@ int CHFGuiApp::OnExit() {
   return 0;
 }
 
-#ifdef _WIN32
-wxIMPLEMENT_APP(CHFGuiApp);
-#else
 wxIMPLEMENT_APP_CONSOLE(CHFGuiApp);
-#endif

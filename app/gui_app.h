@@ -9,15 +9,9 @@
 
 #include "engine/migrator.h"
 
-// A headless tool needs no display on POSIX hosts; on Windows it is the
-// GUI-subsystem application it always was.
-#ifdef _WIN32
-using CHFGuiAppBase = wxApp;
-#else
-using CHFGuiAppBase = wxAppConsole;
-#endif
-
-class CHFGuiApp : public CHFGuiAppBase {
+// Headless on every host: wx's base library only. On Windows the executable
+// is still the GUI-subsystem one it always was, so no console window opens.
+class CHFGuiApp : public wxAppConsole {
  public:
   CHFGuiApp();
   ~CHFGuiApp() override;

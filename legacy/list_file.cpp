@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 
 #include "engine/migrator.h"
@@ -93,7 +94,8 @@ bool CHFMigrator::ReadLegacyList() {
   // Opening a FIFO under that name would wait for a writer forever, and an
   // unattended run must end: only a regular file can be the list.
   if (!platform::FileExists(path.ToStdWstring())) return false;
-  std::ifstream in(platform::ToHostPath(path.ToStdWstring()), std::ios::binary);
+  std::ifstream in(std::filesystem::path(platform::ToHostPath(path.ToStdWstring())),
+                   std::ios::binary);
   if (!in) return false;
 
   char header[kHeaderSize];

@@ -5,6 +5,7 @@
 #include <wx/mstream.h>
 
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 
 #include "platform/platform.h"
@@ -54,7 +55,7 @@ int XMLCALL OnUnknownEncoding(void*, const XML_Char*, XML_Encoding* info) {
 
 // Reads the file, refusing it once it holds more than kMaxConfigBytes.
 bool ReadBounded(const platform::HostPath& path, std::string* bytes) {
-  std::ifstream in(path, std::ios::binary);
+  std::ifstream in(std::filesystem::path(path), std::ios::binary);
   if (!in) return false;
   char chunk[64 * 1024];
   while (in.read(chunk, sizeof(chunk)) || in.gcount() > 0) {

@@ -1,6 +1,8 @@
 #!/usr/bin/env bash
 # Builds the project with AddressSanitizer and UndefinedBehaviorSanitizer and
-# runs the whole test suite. Any failing test or sanitizer report fails it.
+# runs the whole test suite, then cross-builds the tool for Windows, proves it
+# under Wine against the Linux build and packages it. Any failing test,
+# sanitizer report or difference fails it.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
@@ -13,3 +15,4 @@ export UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1
 ctest --test-dir build --output-on-failure -j"$(nproc)"
 scripts/fuzz.sh
 scripts/test_win32.sh
+scripts/package_win64.sh >/dev/null

@@ -70,6 +70,8 @@ void PrintDump(const std::vector<StoredHotFolder>& folders) {
 
 void DescribeCommandLine(wxCmdLineParser* parser) {
   parser->SetLogo("hfstore: inspect the hot-folder configuration store.");
+  // Options start with "-" on every host, so the usage reads the same on all.
+  parser->SetSwitchChars("-");
   parser->AddSwitch("h", "help", "show this help", wxCMD_LINE_OPTION_HELP);
   parser->AddOption("", "store", "read this database file instead of the fixed location",
                     wxCMD_LINE_VAL_STRING);

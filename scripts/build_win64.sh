@@ -1,0 +1,32 @@
+#!/usr/bin/env bash
+# Cross-builds hfmigrate.exe, hfstore.exe, the hotfolder.exe stand-in and the
+# Windows platform tests for 64-bit Windows into build-win64/, statically:
+# the dependencies come from Debian's source packages, built once into a cache
+# outside the work tree by scripts/win64_deps.sh.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+scripts/setup.sh \
+  g++-mingw-w64-x86-64-posix gcc-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64 \
+  googletest dpkg-dev xz-utils tcl wine wine64
+deps="$(scripts/win64_deps.sh)"
+# Libraries found in another dependency prefix must not stay in the cache.
+if ! grep -qxF "HF_WIN64_DEPS:PATH=$deps" build-win64/CMakeCache.txt 2>/dev/null; then
+  rm -f build-win64/CMakeCache.txt
+fi
+
+cmake -S . -B build-win64 -DCMAKE_BUILD_TYPE=Release \
+  -DCMAKE_TOOLCHAIN_FILE="$PWD/cmake/mingw-w64-x86_64.cmake" -DHF_WIN64_DEPS="$deps" >/dev/null
+cmake --build build-win64 -j"$(nproc)"
+
+# Static: every DLL an executable imports is one of Windows' own, which Wine
+# implements; a runtime of the compiler or of a dependency is a failure.
+wine_dlls="$(dirname "$(find /usr/lib -path '*wine/x86_64-windows/kernel32.dll' | head -1)")"
+for exe in build-win64/bin/*.exe build-win64/tests/*.exe; do
+  for dll in $(x86_64-w64-mingw32-objdump -p "$exe" | awk '/DLL Name:/ {print tolower($3)}'); do
+    if [ ! -f "$wine_dlls/$dll" ]; then
+      echo "build_win64: $exe needs $dll, which Windows does not have" >&2
+      exit 1
+    fi
+  done
+done
