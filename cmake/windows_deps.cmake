@@ -7,7 +7,7 @@ if(NOT EXISTS "${HF_WIN64_DEPS}/bin/wx-config")
   message(FATAL_ERROR "HF_WIN64_DEPS must name the prefix scripts/build_win64.sh builds")
 endif()
 list(APPEND CMAKE_FIND_ROOT_PATH ${HF_WIN64_DEPS})
-add_link_options(-static)
+add_link_options(-static $<$<CONFIG:Release>:-s>)
 
 set(wxWidgets_CONFIG_EXECUTABLE ${HF_WIN64_DEPS}/bin/wx-config)
 find_package(wxWidgets 3.2 REQUIRED COMPONENTS base xml)

@@ -48,4 +48,10 @@ mkdir -p dist
 rm -f dist/hfmigrate-win64.zip
 (cd "$stage" && zip -q -X "$OLDPWD/dist/hfmigrate-win64.zip" hfmigrate.exe hfstore.exe \
   README-windows.txt)
+# Exactly these three; never the stand-in.
+contents="$(zipinfo -1 dist/hfmigrate-win64.zip | LC_ALL=C sort | tr '\n' ' ')"
+if [ "$contents" != "README-windows.txt hfmigrate.exe hfstore.exe " ]; then
+  echo "package_win64: unexpected contents: $contents" >&2
+  exit 1
+fi
 unzip -l dist/hfmigrate-win64.zip
