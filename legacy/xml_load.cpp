@@ -7,6 +7,7 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <vector>
 
 #include "platform/platform.h"
 
@@ -90,6 +91,48 @@ bool PlainlyWithinBounds(const std::string& bytes) {
   return true;
 }
 
+bool IsBlank(const wxString& text) {
+  for (wxUniChar c : text) {
+    if (c != ' ' && c != '\t' && c != '\n' && c != '\r') return false;
+  }
+  return true;
+}
+
+// wx joins the pieces expat hands over for one text (split at line ends and
+// references) into one node, but its default mode drops each piece that is
+// blank on its own, so "\n  value" would read "  value". The document is
+// therefore loaded with every piece kept, and only the text nodes that are
+// blank as a whole are dropped here. The siblings are relinked in one pass:
+// unlinking each node by itself would walk its siblings every time.
+void DropBlankText(wxXmlNode* root) {
+  std::vector<wxXmlNode*> elements{root};
+  while (!elements.empty()) {
+    wxXmlNode* element = elements.back();
+    elements.pop_back();
+    wxXmlNode* kept = nullptr;
+    wxXmlNode* next = nullptr;
+    for (wxXmlNode* child = element->GetChildren(); child; child = next) {
+      next = child->GetNext();
+      if (child->GetType() == wxXML_TEXT_NODE && IsBlank(child->GetContent())) {
+        delete child;
+        continue;
+      }
+      if (kept) {
+        kept->SetNext(child);
+      } else {
+        element->SetChildren(child);
+      }
+      kept = child;
+      if (child->GetType() == wxXML_ELEMENT_NODE) elements.push_back(child);
+    }
+    if (kept) {
+      kept->SetNext(nullptr);
+    } else {
+      element->SetChildren(nullptr);
+    }
+  }
+}
+
 }  // namespace
 
 bool XmlWithinBounds(const std::string& bytes) {
@@ -112,5 +155,7 @@ bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc) {
   // The tool prints nothing; wx would log a parse failure of its own.
   wxLogNull quiet;
   wxMemoryInputStream stream(bytes.data(), bytes.size());
-  return doc->Load(stream, "UTF-8") && doc->GetRoot() != nullptr;
+  if (!doc->Load(stream, "UTF-8", wxXMLDOC_KEEP_WHITESPACE_NODES) || !doc->GetRoot()) return false;
+  DropBlankText(doc->GetRoot());
+  return true;
 }

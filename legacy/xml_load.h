@@ -21,8 +21,10 @@ constexpr int kMaxConfigDepth = 256;
 // kMaxConfigBytes.
 bool XmlWithinBounds(const std::string& bytes);
 
-// Loads the file at a Windows path into `doc`, encoding "UTF-8", dropping
-// text nodes that hold only white space. False, with nothing logged, when
+// Loads the file at a Windows path into `doc`, encoding "UTF-8". A text node
+// that holds only white space is dropped; every other one is kept whole, as
+// XML gives it: references replaced, line ends read as a line feed, leading
+// and trailing white space included. False, with nothing logged, when
 // the file cannot be read, is too large (before or after entity expansion)
 // or too deep, or has no root element.
 bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc);
