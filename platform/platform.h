@@ -31,9 +31,11 @@ using HostPath = std::string;
 // this is the identity. On POSIX hosts drives live in the Wine-style prefix
 // ($WINEPREFIX, else $HOME/.wine): "X:\rest" is "<prefix>/dosdevices/x:/rest",
 // "\\server\share\rest" is "<prefix>/dosdevices/unc/server/share/rest", a
-// relative path stays relative. "." and ".." are resolved in Windows form and
-// never climb above the drive or share root. A component missing in its exact
-// case is matched by a single directory entry that differs only in case.
+// relative path counts from the current directory's Windows form and names
+// nothing (empty) when that lies outside every drive. "." and ".." are
+// resolved in Windows form and never climb above the drive or share root. A
+// component missing in its exact case is matched by a single directory entry
+// that differs only in case.
 HostPath ToHostPath(const std::wstring& windows_path);
 
 // The reverse: a host path shown as a Windows path, through the drive whose

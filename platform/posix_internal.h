@@ -26,7 +26,7 @@ bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b);
 std::string PrefixDirectory();
 
 // A Windows path placed on the host: the host directory of its drive or share
-// (empty for a relative path) and the components below it, each already
+// and the components below it, each already
 // matched to an existing entry where one differs only in case.
 struct MappedPath {
   bool valid = false;
@@ -37,7 +37,8 @@ struct MappedPath {
 };
 
 // Maps a Windows path into the prefix. Not valid for a path that names no
-// place (empty, rooted without a drive, a share without server or name).
+// place (empty, rooted without a drive, a share without server or name,
+// relative while the current directory lies outside every drive).
 MappedPath MapWindowsPath(const std::wstring& windows_path);
 
 // Creates a host directory and its missing parents (mode 0777 less umask).

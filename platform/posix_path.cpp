@@ -22,11 +22,9 @@ bool IsAsciiLetter(wchar_t c) {
 
 // Adds the components of `rest` (backslash-separated) to `parts`. "." and
 // empty components vanish; ".." removes the previous component but never
-// one of the first `floor` (the share's server and name). In a rooted path a
-// ".." at the root is dropped, as Windows does, so no path leaves its drive;
-// a relative path keeps leading ".." components.
-void AddComponents(const std::wstring& rest, size_t floor, bool rooted,
-                   std::vector<std::wstring>* parts) {
+// one of the first `floor` (the share's server and name). A ".." at the root
+// is dropped, as Windows does, so no path leaves its drive.
+void AddComponents(const std::wstring& rest, size_t floor, std::vector<std::wstring>* parts) {
   size_t start = 0;
   while (start <= rest.size()) {
     size_t end = rest.find(L'\\', start);
@@ -36,10 +34,8 @@ void AddComponents(const std::wstring& rest, size_t floor, bool rooted,
     if (part.empty() || part == L".") continue;
     if (part != L"..") {
       parts->push_back(part);
-    } else if (parts->size() > floor && parts->back() != L"..") {
+    } else if (parts->size() > floor) {
       parts->pop_back();
-    } else if (!rooted) {
-      parts->push_back(part);
     }
   }
 }
@@ -136,6 +132,17 @@ bool IsWithin(const std::string& path, const std::string& dir) {
          (path.size() == dir.size() || path[dir.size()] == '/');
 }
 
+// The current directory as a Windows path ("D:\Jobs"); empty when it lies
+// outside every drive of the prefix.
+std::wstring CurrentWindowsDirectory() {
+  char cwd[PATH_MAX];
+  if (getcwd(cwd, sizeof cwd) == nullptr) return std::wstring();
+  const std::wstring windows = FromHostPath(cwd);
+  const bool on_drive =
+      windows.size() >= 3 && IsAsciiLetter(windows[0]) && windows.compare(1, 2, L":\\") == 0;
+  return on_drive ? windows : std::wstring();
+}
+
 }  // namespace
 
 std::string MappedPath::Join() const {
@@ -179,17 +186,22 @@ MappedPath MapWindowsPath(const std::wstring& windows_path) {
       if (name.empty() || name == L"." || name == L"..") return mapped;
     }
     parts = {server, share};
-    if (share_end != std::wstring::npos) AddComponents(path.substr(share_end + 1), 2, true, &parts);
+    if (share_end != std::wstring::npos) AddComponents(path.substr(share_end + 1), 2, &parts);
     mapped.root = prefix + "/dosdevices/unc";
   } else if (path.size() >= 2 && IsAsciiLetter(path[0]) && path[1] == L':') {
     // "X:rest" has no current directory of its own here: it counts from X:\.
-    AddComponents(path.substr(2), 0, true, &parts);
+    AddComponents(path.substr(2), 0, &parts);
     mapped.root = prefix + "/dosdevices/" + static_cast<char>(FoldCase(path[0])) + ":";
   } else if (path[0] == L'\\') {
     // Rooted on "the current drive": there is none to take it from.
     return mapped;
   } else {
-    AddComponents(path, 0, false, &parts);
+    // Relative to the current directory, as on Windows: its Windows form
+    // comes first. Outside every drive there is none, and the path names
+    // nothing rather than a host file beyond the prefix's drives.
+    const std::wstring current = CurrentWindowsDirectory();
+    if (current.empty()) return mapped;
+    return MapWindowsPath(current + L"\\" + path);
   }
   if (prefix.empty() && !mapped.root.empty()) return mapped;
   ResolveParts(parts, &mapped);

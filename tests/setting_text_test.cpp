@@ -1,7 +1,9 @@
 // Setting texts as hand-edited folder.cfg files write them, read by the real
-// engine into a real store and seen through the built hfstore's dump.
+// engine into a real store and seen through the built hfstore's dump; and
+// relative folder paths in the legacy list.
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -72,6 +74,24 @@ TEST(SettingText, TakenWholeAsWritten) {
     std::string summary = cases[i].second;
     if (summary[0] == '|') summary = kDefaultChain + summary;
     EXPECT_EQ(Summary(folders[i]), summary) << cases[i].first;
+  }
+}
+
+// A relative path counts from the current directory's Windows form; from
+// outside every drive it names nothing, though a host file lies there.
+TEST(SettingText, RelativeFolderPathStaysOnTheDrives) {
+  const std::filesystem::path original = std::filesystem::current_path();
+  for (bool on_drive : {false, true}) {
+    TempPrefix prefix;
+    WriteLegacyList(prefix, {{"Rel", 2}});
+    const std::filesystem::path current = on_drive ? prefix.Drive('d') : prefix.root();
+    prefix.WriteFile(current / "Rel" / "[_KYR_HotFolder_]" / "folder.cfg", "<r/>");
+    std::filesystem::current_path(current);
+    CHFMigrator engine;
+    engine.Run();
+    std::filesystem::current_path(original);
+    EXPECT_EQ(engine.m_Status.size() == 1 ? engine.m_Status[0].utf8_string() : "",
+              on_drive ? "Success" : "Failed; File missing");
   }
 }
 
