@@ -23,6 +23,7 @@
 #include "store/store.h"
 #include "store/store_reader.h"
 #include "tests/legacy_fixture.h"
+#include "tests/snapshot.h"
 #include "tests/temp_prefix.h"
 
 namespace {
@@ -171,7 +172,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const TempPrefix& prefix = Prefix();
   const Situation situation = SituationFor(size);
   ResetInstallation(prefix, InputBytes(data, size), situation);
-  const Tree before = Snapshot(prefix.root());
+  bool whole = false;
+  const Tree before = Snapshot(prefix.root(), &whole);
+  FUZZ_CHECK(whole);
   CheckLoadBounds();
 
   CHFMigrator engine;
@@ -187,7 +190,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 
   // Nothing else in the installation changed, and the settings directory
   // is whole under exactly one of its two names.
-  const Tree after = Snapshot(prefix.root());
+  const Tree after = Snapshot(prefix.root(), &whole);
+  FUZZ_CHECK(whole);
   FUZZ_CHECK(Unchangeable(after) == Unchangeable(before));
   const std::string folder = kFolderOnD;
   const Tree settings = Subtree(before, folder + "/" + kSettingsDir);

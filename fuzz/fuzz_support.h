@@ -1,6 +1,5 @@
 // What the fuzz targets share: a property check that libFuzzer sees as a
-// crash, a temporary directory in memory, wide text from arbitrary bytes,
-// and a cheap picture of a directory tree.
+// crash, a temporary directory in memory, and wide text from arbitrary bytes.
 #ifndef HF_FUZZ_FUZZ_SUPPORT_H_
 #define HF_FUZZ_FUZZ_SUPPORT_H_
 
@@ -10,12 +9,7 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <map>
 #include <string>
-#include <system_error>
 
 // A broken property aborts, so libFuzzer keeps the input as a crash.
 #define FUZZ_CHECK(condition)                                                          \
@@ -70,32 +64,6 @@ inline std::wstring WideFromBytes(const std::uint8_t* data, std::size_t size) {
     i += extra + 1;
   }
   return text;
-}
-
-// Every entry below `root` (symbolic links not followed), by path relative
-// to it: a directory as "d", a link as "l" and its target, a file as "f" and
-// its bytes. The prefixes fuzzed here hold a few small files, so reading
-// them all is cheap.
-using Tree = std::map<std::string, std::string>;
-
-inline Tree Snapshot(const std::filesystem::path& root) {
-  namespace fs = std::filesystem;
-  Tree tree;
-  std::error_code ec;
-  for (auto it = fs::recursive_directory_iterator(root, ec); !ec && it != fs::end(it);
-       it.increment(ec)) {
-    std::string name = fs::relative(it->path(), root).generic_string();
-    if (it->is_symlink(ec)) {
-      tree[name] = "l" + fs::read_symlink(it->path(), ec).string();
-    } else if (it->is_directory(ec)) {
-      tree[name] = "d";
-    } else {
-      std::ifstream in(it->path(), std::ios::binary);
-      tree[name] = "f" + std::string(std::istreambuf_iterator<char>(in), {});
-    }
-  }
-  FUZZ_CHECK(!ec);
-  return tree;
 }
 
 #endif  // HF_FUZZ_FUZZ_SUPPORT_H_
