@@ -1,4 +1,6 @@
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <string>
 #include <vector>
@@ -26,7 +28,7 @@ TEST(ReadLegacyList, FileLayouts) {
   const std::string torn = List({{"D:\\a", 2}, {"D:\\torn", 2}});
   const struct {
     const char* name;
-    std::string bytes;  // "<none>" for no file at all
+    std::string bytes;  // "<none>" for no file at all, "<fifo>" for a FIFO
     bool result;
     std::wstring folders;  // "flag path;" for each listed folder
   } cases[] = {
@@ -38,6 +40,7 @@ TEST(ReadLegacyList, FileLayouts) {
       {"shorter than a header", List({}).substr(0, 39), false, L""},
       {"empty file", "", false, L""},
       {"no file", "<none>", false, L""},
+      {"a FIFO, which would wait for a writer", "<fifo>", false, L""},
       {"only an empty path", List({{"", 2}}), true, L""},
       {"empty path among others", List({{"D:\\a", 2}, {"", 2}, {"D:\\c", 0}}), true,
        L"1 D:\\a;0 D:\\c;"},
@@ -55,10 +58,15 @@ TEST(ReadLegacyList, FileLayouts) {
       {"Windows-1252 path", List({{"D:\\\x80 \x81\x8a\x9f\xe9\xff", 2}}), true,
        L"1 D:\\\u20AC \u0081\u0160\u0178\u00E9\u00FF;"},
   };
+  alarm(60);  // a read that blocks ends the process: a hang fails
   for (const auto& c : cases) {
     SCOPED_TRACE(c.name);
     TempPrefix prefix;
-    if (c.bytes != "<none>") prefix.WriteFile(LegacyListHostPath(prefix), c.bytes);
+    if (c.bytes[0] != '<') prefix.WriteFile(LegacyListHostPath(prefix), c.bytes);
+    if (c.bytes == "<fifo>") {
+      std::filesystem::create_directories(LegacyListHostPath(prefix).parent_path());
+      ASSERT_EQ(mkfifo(LegacyListHostPath(prefix).c_str(), 0600), 0);
+    }
     CHFMigrator engine;
     EXPECT_EQ(engine.ReadLegacyList(), c.result);
     ASSERT_EQ(engine.m_Folders.size(), engine.m_EnabledFlags.size());
@@ -68,6 +76,7 @@ TEST(ReadLegacyList, FileLayouts) {
     }
     EXPECT_EQ(folders, c.folders);
   }
+  alarm(0);
 }
 
 }  // namespace
