@@ -7,8 +7,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <string>
 #include <system_error>
 #include <vector>
@@ -112,11 +110,6 @@ std::vector<StoredHotFolder> StoredFolders() {
   return folders;
 }
 
-std::string FileBytes(const std::filesystem::path& path) {
-  std::ifstream in(path, std::ios::binary);
-  return std::string(std::istreambuf_iterator<char>(in), {});
-}
-
 bool IsFilterSettingXml(const wxString& text) {
   wxLogNull quiet;
   wxStringInputStream stream(text);
@@ -204,7 +197,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   if (situation.refused) {
     FUZZ_CHECK(!success);
     FUZZ_CHECK(kept == settings);
-    FUZZ_CHECK(FileBytes(StoreHostPath()) == kDamagedStore);
+    FUZZ_CHECK(TempPrefix::ReadFile(StoreHostPath()) == kDamagedStore);
     ReleaseStore(prefix);
     return 0;
   }
