@@ -70,31 +70,11 @@ TEST_F(FolderReaderTest, CasesFromData) {
     EXPECT_TRUE(Read(c.at(1), "1", "F"));
     EXPECT_EQ(Dump(engine_.m_FolderSettings) + "|" + Dump(engine_.m_ImposeInfo) + "|" +
                   Dump(engine_.m_ImposeInfoVDP) + "|" + Dump(engine_.m_DriverSettings, true) + "|" +
-                  Dump(engine_.m_FilterEnable),
+                  Dump(engine_.m_FilterEnable, true) + "|" + Dump(engine_.m_TiffItFilter, true) +
+                  Dump(engine_.m_Dcs2Filter, true),
               c.at(2))
         << c[1].substr(0, 200);
   }
-}
-
-TEST_F(FolderReaderTest, TenFilterEnableTexts) {
-  // DCS2FILTER has no section and JPEG2PDF no enable text: neither may
-  // borrow the "1" of the filter before it.
-  const std::pair<const char*, const char*> filters[] = {
-      {"ONEBITTIFF", "1"}, {"CTLWFILTER", "1"},  {"DCS2FILTER", nullptr}, {"EPS2PSFILTER", "0"},
-      {"EXPORTPS", " 1 "}, {"JPEG2PDF", ""},     {"PDF2GO", "1"},         {"PEXFILTER", "2"},
-      {"TIFF2PDF", "0"},   {"TIFFITFILTER", "1"}};
-  std::string body;
-  for (const auto& [name, enable] : filters) {
-    std::string section = std::string("<") + name + "><K>v</K></" + name + ">";
-    if (enable && *enable) body += Container("id\n", enable, section);
-    if (enable && !*enable) body += "<FILTERID>id\n<a/><e/>" + section + "</FILTERID>";
-  }
-  EXPECT_TRUE(Read(Doc(body)));
-  // Entries come in the order of the table of legacy filters.
-  EXPECT_EQ(Dump(engine_.m_FilterEnable, true),
-            "EPS2PSFILTER=0;JPEG2PDF=;TIFF2PDF=0;TIFFITFILTER=1;ONEBITTIFF=1;CTLWFILTER=1;"
-            "EXPORTPS= 1 ;PEXFILTER=2;PDF2GO=1;DCS2FILTER=;MICROSOFT=0;");
-  EXPECT_EQ(Dump(engine_.m_TiffItFilter) + Dump(engine_.m_Dcs2Filter, true), "K=v;");
 }
 
 // Nothing of one folder may reach the next, whatever map it is in.

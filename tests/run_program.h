@@ -47,29 +47,19 @@ inline int WaitProgram(pid_t pid) {
   return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
+// A finished run: its exit status (-1 when it did not exit normally), how
+// long it took, and what it wrote to standard output and error.
 struct RunResult {
   int status = -1;
   double seconds = 0;
-};
-
-inline RunResult RunProgram(const std::string& path, const std::vector<std::string>& args = {}) {
-  auto start = std::chrono::steady_clock::now();
-  RunResult result;
-  pid_t pid = StartProgram(path, args);
-  if (pid > 0) result.status = WaitProgram(pid);
-  result.seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-  return result;
-}
-
-// A finished run with what it wrote to standard output and error.
-struct CapturedRun {
-  int status = -1;
   std::string out;
   std::string err;
 };
+using CapturedRun = RunResult;
 
-inline CapturedRun RunCaptured(const std::string& path, const std::vector<std::string>& args) {
-  CapturedRun run;
+inline RunResult RunProgram(const std::string& path, const std::vector<std::string>& args = {}) {
+  const auto start = std::chrono::steady_clock::now();
+  RunResult run;
   FILE* streams[2] = {tmpfile(), tmpfile()};  // files, so neither can fill and block the child
   if (streams[0] && streams[1]) {
     posix_spawn_file_actions_t actions;
@@ -90,7 +80,12 @@ inline CapturedRun RunCaptured(const std::string& path, const std::vector<std::s
   for (FILE* stream : streams) {
     if (stream) fclose(stream);
   }
+  run.seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   return run;
+}
+
+inline RunResult RunCaptured(const std::string& path, const std::vector<std::string>& args) {
+  return RunProgram(path, args);
 }
 
 // The hotfolder.exe stand-in, running until the scope ends, so that the tool
