@@ -58,23 +58,13 @@ Tree Install(const TempPrefix& prefix) {
                         static_cast<std::uint16_t>(std::stoi(row[1]))});
   }
   WriteLegacyList(prefix, listed);
-  Tree tree;
-  for (const auto& [name, entry] : Snapshot(prefix.root())) {
-    std::string moved = name;
-    for (const std::string& dir : retired) {
-      if (!name.rfind(dir, 0) && (name.size() == dir.size() || name[dir.size()] == '/'))
-        moved = dir.substr(0, dir.size() - 1) + "Old]" + name.substr(dir.size());
-    }
-    tree[moved] = entry;
-  }
-  return tree;
+  return Retired(Snapshot(prefix.root()), retired);
 }
 
-// The tree without the store's folder, and the names that differ.
-std::string Differences(Tree after, const Tree& expected) {
+// The names that differ, the store's folder left out.
+std::string Differences(const Tree& all, const Tree& expected) {
+  const Tree after = Without(all, kStoreDir);
   std::string names;
-  for (auto it = after.lower_bound(kStoreDir); it != after.end() && !it->first.rfind(kStoreDir, 0);)
-    it = after.erase(it);
   for (const auto& [name, entry] : after)
     if (!expected.count(name) || expected.at(name) != entry) names += name + "\n";
   for (const auto& [name, entry] : expected) names += after.count(name) ? "" : name + "\n";

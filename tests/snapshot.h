@@ -1,4 +1,5 @@
-// A picture of a directory tree, to see what a run changed.
+// A picture of a directory tree, to see what a run changed, and the picture
+// a run that retires settings directories must leave.
 #ifndef HF_TESTS_SNAPSHOT_H_
 #define HF_TESTS_SNAPSHOT_H_
 
@@ -6,6 +7,7 @@
 #include <map>
 #include <string>
 #include <system_error>
+#include <vector>
 
 #include "tests/temp_prefix.h"
 
@@ -29,6 +31,28 @@ inline Tree Snapshot(const std::filesystem::path& root, bool* whole = nullptr) {
                                                : "o";
   }
   if (whole) *whole = !ec;
+  return tree;
+}
+
+// The tree once the settings directories `dirs` (names in the tree) are
+// retired: renamed to "[_KYR_HotFolder_Old]", their content unchanged.
+inline Tree Retired(const Tree& tree, const std::vector<std::string>& dirs) {
+  Tree moved;
+  for (const auto& [name, entry] : tree) {
+    std::string to = name;
+    for (const std::string& dir : dirs) {
+      if (!name.rfind(dir, 0) && (name.size() == dir.size() || name[dir.size()] == '/'))
+        to = dir.substr(0, dir.size() - 1) + "Old]" + name.substr(dir.size());
+    }
+    moved[to] = entry;
+  }
+  return moved;
+}
+
+// The tree without `dir` and what it holds.
+inline Tree Without(Tree tree, const std::string& dir) {
+  for (auto it = tree.lower_bound(dir); it != tree.end() && !it->first.rfind(dir, 0);)
+    it = tree.erase(it);
   return tree;
 }
 
