@@ -32,6 +32,7 @@ const Kind kKinds[] = {
     {"Office", "Office"},
     {"Archive", "Archive"},
     {"Caf\xE9 Menus", "Caf\xC3\xA9 Menus"},
+    {"Proofs \x96 Final", "Proofs \xE2\x80\x93 Final"},  // an en dash, 0x80-0x9F in 1252
     {"Posters", "Posters"},
 };
 

@@ -20,13 +20,20 @@ cmake -S . -B build-win64 -DCMAKE_BUILD_TYPE=Release \
 cmake --build build-win64 -j"$(nproc)"
 
 # Static: every DLL an executable imports is one of Windows' own, which Wine
-# implements; a runtime of the compiler or of a dependency is a failure.
+# implements; a runtime of the compiler or of a dependency is a failure (Wine
+# carries a zlib1.dll of its own, so those names are refused by name too).
 wine_dlls="$(dirname "$(find /usr/lib -path '*wine/x86_64-windows/kernel32.dll' | head -1)")"
 for exe in build-win64/bin/*.exe build-win64/tests/*.exe; do
   for dll in $(x86_64-w64-mingw32-objdump -p "$exe" | awk '/DLL Name:/ {print tolower($3)}'); do
-    if [ ! -f "$wine_dlls/$dll" ]; then
+    if [ ! -f "$wine_dlls/$dll" ] || [[ "$dll" =~ ^(lib|zlib|wx|sqlite|expat) ]]; then
       echo "build_win64: $exe needs $dll, which Windows does not have" >&2
       exit 1
     fi
   done
 done
+# No console window: the tool is a GUI-subsystem program.
+subsystem="$(x86_64-w64-mingw32-objdump -p build-win64/bin/hfmigrate.exe | awk '/^Subsystem/')"
+if [[ "$subsystem" != *"(Windows GUI)"* ]]; then
+  echo "build_win64: hfmigrate.exe is not a GUI-subsystem program" >&2
+  exit 1
+fi

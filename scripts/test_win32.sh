@@ -8,7 +8,11 @@
 #     byte-identical;
 #   - start-up: with no server running, hotfolder.exe is launched from the
 #     tool's directory, awaited and stopped; with one running, it is neither
-#     awaited nor stopped; the exit status is -1 either way.
+#     awaited nor stopped; the exit status is -1 either way. The demo runs
+#     with no server, from the server's directory, the only place a stand-in
+#     is: the store records the running server's directory (the PDF filter's
+#     error path), so a stand-in not launched from there shows as a
+#     difference from the Linux run.
 # Any difference or failure, a missing tool included, fails it.
 #
 # The Linux executables come from build/ (HF_LINUX_BIN names another place).
