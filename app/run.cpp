@@ -5,7 +5,9 @@
 
 bool CHFMigrator::Run() {
   bool read = ReadLegacyList();
+  BeginRun();
   MigrateFolders();
+  EndRun();
   return read;
 }
 

@@ -94,6 +94,10 @@ bool CHFMigrator::RegisterHotFolder() {
   // Asked for before the move: it opens the store then, so that after the
   // move only the store's own transaction remains.
   RODuriZudaze& store = RODuriZudaze::GetInstance();
+  // A folder listed disabled is stored disabled by the creation itself, so
+  // that neither the running server nor a crash ever finds it enabled; the
+  // DisableHotFolder below then finds it so.
+  if (!m_CurrentEnabled) store.CreateNextDisabled(setting.FolderPath);
   Retirement retirement = RetireSettingsDirectory(paths);
   bool registered = store.CreateHotFolder(setting, folder, job, filter, impose, preflight) != 0;
   // Nothing was created, so the legacy settings go back where a later run

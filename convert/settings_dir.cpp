@@ -27,8 +27,12 @@ void ClearBlockingAttributes(const wxString& path, std::optional<std::uint32_t> 
   platform::SetFileAttributes(path.ToStdWstring(), *attributes & ~kBlockingAttributes);
 }
 
-bool Move(const wxString& from, const wxString& to) {
-  return platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring());
+// Both names live in the hot folder itself, whose entries are synced. A
+// sync the host refuses does not undo the move, which has happened.
+bool Move(const FolderPaths& paths, const wxString& from, const wxString& to) {
+  if (!platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring())) return false;
+  platform::SyncDirectory(paths.full_path.ToStdWstring());
+  return true;
 }
 
 }  // namespace
@@ -46,16 +50,20 @@ FolderPaths MakeFolderPaths(const wxString& folder_path) {
   return paths;
 }
 
+wxString LegacyConfigPath(const wxString& listed_folder) {
+  return listed_folder + kSeparator + kSettingsDirName + kSeparator + L"folder.cfg";
+}
+
 Retirement RetireSettingsDirectory(const FolderPaths& paths) {
   Retirement retirement;
   // The attributes read to be restored are the ones cleared before the
   // first move; a second attempt reads them afresh.
   retirement.attributes = ReadAttributes(paths.settings);
   ClearBlockingAttributes(paths.settings, retirement.attributes);
-  retirement.moved = Move(paths.settings, paths.retired);
+  retirement.moved = Move(paths, paths.settings, paths.retired);
   if (!retirement.moved) {
     ClearBlockingAttributes(paths.settings, ReadAttributes(paths.settings));
-    retirement.moved = Move(paths.settings, paths.retired);
+    retirement.moved = Move(paths, paths.settings, paths.retired);
   }
   return retirement;
 }
@@ -64,8 +72,12 @@ void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retire
   if (!retirement.moved) return;
   // A failed move back leaves the directory where it is; there is nothing
   // safer to do with it.
-  if (!Move(paths.retired, paths.settings)) return;
+  if (!Move(paths, paths.retired, paths.settings)) return;
   if (retirement.attributes) {
     platform::SetFileAttributes(paths.settings.ToStdWstring(), *retirement.attributes);
   }
+}
+
+bool PutBackSettingsDirectory(const FolderPaths& paths) {
+  return Move(paths, paths.retired, paths.settings);
 }

@@ -22,6 +22,10 @@ struct FolderPaths {
 // the same paths wherever the tool runs.
 FolderPaths MakeFolderPaths(const wxString& folder_path);
 
+// The folder.cfg the folder reader looks for, built from the folder path as
+// listed.
+wxString LegacyConfigPath(const wxString& listed_folder);
+
 // What retiring did, so that a refused registration can undo it.
 struct Retirement {
   bool moved = false;
@@ -30,12 +34,19 @@ struct Retirement {
 
 // Clears read-only and system (nothing else) and moves the settings directory
 // to its retired name, once more after clearing again if the first move
-// fails. An existing retired directory is never replaced.
+// fails. An existing retired directory is never replaced. A move is made
+// durable before this returns, so that no store commit after it can outlive
+// it in a power loss.
 Retirement RetireSettingsDirectory(const FolderPaths& paths);
 
 // Puts a retired settings directory back under its own name, with the
 // attributes it had, after the store refused the folder: its settings must
 // stay within reach of a later run. Does nothing unless this run moved it.
 void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retirement);
+
+// Puts a retired settings directory back under its own name, durably, for a
+// folder an interrupted run retired but never registered. Its attributes
+// stay as retiring left them.
+bool PutBackSettingsDirectory(const FolderPaths& paths);
 
 #endif  // HF_CONVERT_SETTINGS_DIR_H_

@@ -21,10 +21,18 @@ class CHFMigrator {
  public:
   CHFMigrator() = default;
 
-  // app/run.cpp: the whole migration, ReadLegacyList then MigrateFolders,
-  // answering what ReadLegacyList answered; and the per-folder loop.
+  // app/run.cpp: the whole migration, ReadLegacyList then MigrateFolders
+  // between BeginRun and EndRun, answering what ReadLegacyList answered;
+  // and the per-folder loop.
   bool Run();
   void MigrateFolders();
+
+  // app/run_guard.cpp. BeginRun finishes what an interrupted run left (it
+  // puts back the settings of folders that run retired but never
+  // registered), then records durably which listed folders this run is
+  // about to retire; EndRun removes the record of a complete run.
+  void BeginRun();
+  void EndRun();
 
   // legacy/list_file.cpp
   bool ReadLegacyList();
@@ -51,6 +59,7 @@ class CHFMigrator {
   wxArrayString m_Status;        // one outcome text per folder
   wxArrayString m_EnabledFlags;  // "1" or "0", parallel to m_Folders
   bool m_CurrentEnabled = true;  // the folder now being converted
+  bool m_RunRecorded = false;    // BeginRun left the record of this run
 
   // The 31 settings maps. "Conv" maps hold a legacy filter's converted
   // settings.

@@ -79,6 +79,21 @@ bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attribute
 // exists: an existing directory is never replaced.
 bool MoveDirectory(const std::wstring& from, const std::wstring& to);
 
+// Makes the entries of a directory durable: a rename or a new file inside it
+// survives a power loss once this answers true.
+bool SyncDirectory(const std::wstring& windows_path);
+
+// Writes a file anew, durably: the bytes go to a file beside it, are flushed,
+// and that file is renamed over the old one, so a reader or a crash finds
+// the old file or the new one whole, never a part of either.
+bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes);
+
+// Renames a regular file. Fails, changing nothing, when the target exists.
+bool RenameFile(const std::wstring& from, const std::wstring& to);
+
+// Removes a regular file. True when none is left under that name.
+bool RemoveFile(const std::wstring& windows_path);
+
 // ---- Named mutex ----------------------------------------------------------
 
 // True while some process holds a named mutex of that name that can be opened

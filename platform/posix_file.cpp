@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <string>
 
 #include "platform/platform.h"
 #include "platform/posix_internal.h"
@@ -37,6 +38,31 @@ std::uint32_t ParseAttributeText(const char* text, size_t size) {
 
 bool IsNoAttribute(int error) {
   return error == ENODATA || error == ENOTSUP;
+}
+
+bool SyncHostDirectory(const std::string& dir) {
+  const int fd = open(dir.empty() ? "." : dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (fd < 0) return false;
+  const bool synced = fsync(fd) == 0;
+  close(fd);
+  return synced;
+}
+
+std::string HostParent(const std::string& host) {
+  const std::string::size_type slash = host.rfind('/');
+  if (slash == std::string::npos) return ".";
+  return slash == 0 ? "/" : host.substr(0, slash);
+}
+
+bool WriteAll(int fd, const std::string& bytes) {
+  std::size_t done = 0;
+  while (done < bytes.size()) {
+    const ssize_t n = write(fd, bytes.data() + done, bytes.size() - done);
+    if (n < 0 && errno == EINTR) continue;
+    if (n <= 0) return false;
+    done += static_cast<std::size_t>(n);
+  }
+  return true;
 }
 
 }  // namespace
@@ -120,6 +146,46 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
   if (rename(source.c_str(), target.c_str()) == 0) return true;
   rmdir(target.c_str());
   return false;
+}
+
+bool SyncDirectory(const std::wstring& windows_path) {
+  const HostPath host = ToHostPath(windows_path);
+  return !host.empty() && SyncHostDirectory(host);
+}
+
+bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
+  const HostPath host = ToHostPath(windows_path);
+  if (host.empty()) return false;
+  const std::string temporary = host + ".new";
+  const int fd = open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+  if (fd < 0) return false;
+  bool written = WriteAll(fd, bytes) && fsync(fd) == 0;
+  written = close(fd) == 0 && written;
+  if (!written || rename(temporary.c_str(), host.c_str()) != 0) {
+    unlink(temporary.c_str());
+    return false;
+  }
+  return SyncHostDirectory(HostParent(host));
+}
+
+bool RenameFile(const std::wstring& from, const std::wstring& to) {
+  const HostPath source = ToHostPath(from);
+  const HostPath target = ToHostPath(to);
+  if (source.empty() || target.empty()) return false;
+  if (renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, target.c_str(), RENAME_NOREPLACE) == 0) {
+    return true;
+  }
+  if (errno != EINVAL && errno != ENOSYS) return false;
+  // A second name refuses an existing target by itself; then the first goes.
+  return link(source.c_str(), target.c_str()) == 0 && unlink(source.c_str()) == 0;
+}
+
+bool RemoveFile(const std::wstring& windows_path) {
+  const HostPath host = ToHostPath(windows_path);
+  struct stat st;
+  if (host.empty()) return false;
+  if (lstat(host.c_str(), &st) != 0) return errno == ENOENT;
+  return S_ISREG(st.st_mode) && unlink(host.c_str()) == 0;
 }
 
 }  // namespace platform

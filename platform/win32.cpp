@@ -14,6 +14,7 @@
 #include <shlobj.h>
 #include <shlwapi.h>
 
+#include <algorithm>
 #include <mutex>
 #include <set>
 
@@ -56,6 +57,11 @@ class ScopedHandle {
 // it and act on another, shorter name.
 bool HasNul(const std::wstring& name) {
   return name.find(L'\0') != std::wstring::npos;
+}
+
+// CreateFileW answers INVALID_HANDLE_VALUE, not null, when it fails.
+HANDLE FileHandle(HANDLE handle) {
+  return handle == INVALID_HANDLE_VALUE ? nullptr : handle;
 }
 
 bool IsSeparator(wchar_t c) {
@@ -151,6 +157,57 @@ bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attribute
 bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
   // Without MOVEFILE_REPLACE_EXISTING an existing target makes the move fail.
   return MoveFileW(from.c_str(), to.c_str()) != 0;
+}
+
+// A directory opened for writing can be flushed: NTFS then writes its
+// entries, a rename inside it included, to the disk.
+bool SyncDirectory(const std::wstring& windows_path) {
+  if (HasNul(windows_path)) return false;
+  ScopedHandle directory(FileHandle(CreateFileW(
+      windows_path.c_str(), GENERIC_READ | GENERIC_WRITE,
+      FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING,
+      FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
+  if (directory.get() == nullptr) return false;
+  return FlushFileBuffers(directory.get()) != 0;
+}
+
+bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
+  if (HasNul(windows_path)) return false;
+  const std::wstring temporary = windows_path + L".new";
+  bool written = false;
+  {
+    ScopedHandle file(FileHandle(CreateFileW(temporary.c_str(), GENERIC_WRITE, 0, nullptr,
+                                             CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr)));
+    if (file.get() == nullptr) return false;
+    std::size_t done = 0;
+    written = true;
+    while (written && done < bytes.size()) {
+      DWORD chunk = static_cast<DWORD>(std::min<std::size_t>(bytes.size() - done, 1 << 20));
+      DWORD n = 0;
+      written = WriteFile(file.get(), bytes.data() + done, chunk, &n, nullptr) != 0 && n > 0;
+      done += n;
+    }
+    written = written && FlushFileBuffers(file.get()) != 0;
+  }
+  // Write-through: the call returns once the new name is on the disk.
+  if (!written || !MoveFileExW(temporary.c_str(), windows_path.c_str(),
+                               MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)) {
+    DeleteFileW(temporary.c_str());
+    return false;
+  }
+  return true;
+}
+
+bool RenameFile(const std::wstring& from, const std::wstring& to) {
+  if (HasNul(from) || HasNul(to)) return false;
+  return MoveFileExW(from.c_str(), to.c_str(), MOVEFILE_WRITE_THROUGH) != 0;
+}
+
+bool RemoveFile(const std::wstring& windows_path) {
+  if (HasNul(windows_path)) return false;
+  if (DeleteFileW(windows_path.c_str())) return true;
+  const DWORD error = GetLastError();
+  return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
 }
 
 // ---- Named mutex ------------------------------------------------------------

@@ -4,8 +4,8 @@
 # It builds the tools, copies the sample into a fresh Wine-style prefix, runs
 # hfmigrate with no server running (so the tool starts the hotfolder.exe
 # stand-in, waits seven seconds, migrates, and stops it again), then shows
-# what the configuration store now holds and which legacy settings
-# directories were retired.
+# what the configuration store now holds, which legacy settings directories
+# were retired, and what hfstore check says of every listed folder.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
@@ -40,5 +40,10 @@ echo "Folders whose legacy settings stay in place (not migrated):"
 for dir in "$prefix"/drive_d/Jobs/*/; do
   [ -d "$dir[_KYR_HotFolder_Old]" ] || windows "${dir%/}"
 done
+echo
+echo "Every listed folder checked against the store and the disk (hfstore check):"
+check=0
+hfstore check || check=$?
+echo "hfstore check exited with status $check (0: every folder with legacy settings migrated as listed)."
 echo
 echo "The full store as JSON: WINEPREFIX=$prefix build/bin/hfstore dump"

@@ -6,6 +6,7 @@
 #include <clocale>
 #include <iostream>
 
+#include "store/hfstore_check.h"
 #include "store/store_json.h"
 #include "store/store_reader.h"
 
@@ -26,6 +27,13 @@ const char kCommandsHelp[] =
     "  dump   The whole store as one JSON object (UTF-8): \"hotFolders\", an\n"
     "         array of hot folders in registration order, each with \"enabled\"\n"
     "         and its six records.\n"
+    "  check  Each folder of the legacy hot-folder list against the store and\n"
+    "         the disk, one tab-separated line each: the result (\"migrated\",\n"
+    "         \"not migrated\", \"interrupted\", \"enabled state differs\" or\n"
+    "         \"settings not retired\"), the folder and what was found; then a\n"
+    "         summary line. With --json, one JSON object instead. Exit status 0\n"
+    "         when every folder that had legacy settings is migrated as listed,\n"
+    "         1 otherwise.\n"
     "\n"
     "Without --store the store at its fixed location is read\n"
     "(C:\\ProgramData\\KYR\\Dirorodiv\\HotFolders.db, through the Wine prefix on\n"
@@ -75,7 +83,8 @@ void DescribeCommandLine(wxCmdLineParser* parser) {
   parser->AddSwitch("h", "help", "show this help", wxCMD_LINE_OPTION_HELP);
   parser->AddOption("", "store", "read this database file instead of the fixed location",
                     wxCMD_LINE_VAL_STRING);
-  parser->AddParam("list|dump", wxCMD_LINE_VAL_STRING);
+  parser->AddSwitch("", "json", "check: print one JSON object instead of lines");
+  parser->AddParam("list|dump|check", wxCMD_LINE_VAL_STRING);
   parser->AddUsageText(kCommandsHelp);
 }
 
@@ -93,14 +102,20 @@ int Run(int argc, char** argv) {
       return kExitUsage;
   }
   wxString command = parser.GetParam(0);
-  if (command != "list" && command != "dump") {
+  if (command != "list" && command != "dump" && command != "check") {
     std::cerr << "hfstore: unknown command '" << Utf8(command) << "'; try 'hfstore --help'.\n";
+    return kExitUsage;
+  }
+  const bool json = parser.Found("json");
+  if (json && command != "check") {
+    std::cerr << "hfstore: --json belongs to check; try 'hfstore --help'.\n";
     return kExitUsage;
   }
   wxString store_option;
   platform::HostPath file = parser.Found("store", &store_option)
                                 ? platform::HostPath(store_option.fn_str())
                                 : StoreHostPath();
+  if (command == "check") return RunCheck(file, json);
   std::vector<StoredHotFolder> folders;
   wxString error;
   if (!ReadStore(file, &folders, &error)) {

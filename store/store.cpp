@@ -25,6 +25,12 @@ std::string EnvironmentValue(const char* name) {
 // it), so the mapping is kept per prefix, and only while the writer holds
 // the store open: a store that is gone is looked for afresh, under whatever
 // names its directories now have.
+// The folder path announced by CreateNextDisabled, until the next creation.
+std::optional<wxString>& NextDisabled() {
+  static std::optional<wxString> path;
+  return path;
+}
+
 const db::StoreLocation& Location() {
   static std::string prefix, home;
   static db::StoreLocation location;
@@ -60,12 +66,38 @@ long RODuriZudaze::CreateHotFolder(db::Setting& setting, db::FolderConfiguration
                                    db::JobConfiguration& job, db::FilterConfiguration& filter,
                                    db::ImposeConfiguration& impose,
                                    db::PreflightConfiguration& preflight) {
+  std::optional<wxString> disabled;
+  disabled.swap(NextDisabled());
   try {
     db::HotFolderRecords records{setting, folder, job, filter, impose, preflight};
-    return Writer().Create(Location(), records) == db::CreateResult::kCreated ? 1 : 0;
+    const bool enabled = !disabled || *disabled != setting.FolderPath;
+    return Writer().Create(Location(), records, enabled) == db::CreateResult::kCreated ? 1 : 0;
   } catch (...) {
     return 0;
   }
+}
+
+void RODuriZudaze::CreateNextDisabled(const wxString& folderPath) {
+  try {
+    NextDisabled() = folderPath;
+  } catch (...) {
+    NextDisabled().reset();  // the folder is then created enabled and disabled after
+  }
+}
+
+RODuriZudaze::Registration RODuriZudaze::FindHotFolder(const wxString& folderPath) {
+  try {
+    switch (Writer().Find(Location(), folderPath)) {
+      case db::Registration::kRegistered:
+        return Registration::kRegistered;
+      case db::Registration::kNotRegistered:
+        return Registration::kNotRegistered;
+      case db::Registration::kUnknown:
+        break;
+    }
+  } catch (...) {
+  }
+  return Registration::kUnknown;
 }
 
 bool RODuriZudaze::DisableHotFolder(const wxString& folderPath) {

@@ -5,8 +5,18 @@
 // CreateHotFolder stores the six records of one hot folder in one durable
 // transaction; a FolderPath already registered is never overwritten. Every
 // failure answers 0 or false; nothing is thrown into the caller.
+//
+// Beyond the service's calls the store offers the tool two of its own: a
+// folder announced as disabled before its CreateHotFolder is stored
+// disabled in that one transaction (the DisableHotFolder that follows then
+// finds it so and answers true without a second commit), and a question
+// whether a folder path is registered, for finishing an interrupted run.
 #ifndef HF_STORE_STORE_H_
 #define HF_STORE_STORE_H_
+
+#include <wx/string.h>
+
+#include <optional>
 
 #include "store/records.h"
 
@@ -19,6 +29,15 @@ class RODuriZudaze {
                        db::ImposeConfiguration& impose, db::PreflightConfiguration& preflight);
 
   bool DisableHotFolder(const wxString& folderPath);
+
+  // The next CreateHotFolder, if it is of this folder path, stores the
+  // folder disabled. Any CreateHotFolder forgets the announcement.
+  void CreateNextDisabled(const wxString& folderPath);
+
+  enum class Registration { kRegistered, kNotRegistered, kUnknown };
+  // Whether a hot folder of that path is stored; kUnknown when the store
+  // cannot be read. Creates nothing.
+  Registration FindHotFolder(const wxString& folderPath);
 
  private:
   RODuriZudaze() = default;

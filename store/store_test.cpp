@@ -184,6 +184,40 @@ TEST(Store, KilledWriterLeavesOnlyWholeFolders) {
   EXPECT_NE(Folder("D:\\Jobs\\After").Create(), 0);
 }
 
+// The running server polls the store while the tool registers folders
+// listed disabled: it must never find one of them enabled.
+TEST(Store, ReaderNeverSeesAFolderListedDisabledEnabled) {
+  TempPrefix prefix;
+  pid_t pid = StartProgram(BinDir() + "/store_crash_writer", {"0", "300", "disabled"});
+  ASSERT_GT(pid, 0);
+  ASSERT_TRUE(WaitFor([&] { return fs::exists(StoreFile(prefix)); }, 10000));
+  sqlite3* reader = nullptr;
+  ASSERT_EQ(sqlite3_open_v2(StoreFile(prefix).c_str(), &reader, SQLITE_OPEN_READONLY, nullptr),
+            SQLITE_OK);
+  sqlite3_busy_timeout(reader, 1000);
+  int status = 0, polls = 0;
+  std::int64_t seen = 0, enabled = 0;
+  while (waitpid(pid, &status, WNOHANG) == 0) {
+    sqlite3_stmt* st = nullptr;
+    if (sqlite3_prepare_v2(reader, "SELECT count(*), total(enabled) FROM hot_folder", -1, &st,
+                           nullptr) == SQLITE_OK &&
+        sqlite3_step(st) == SQLITE_ROW) {
+      seen = sqlite3_column_int64(st, 0);
+      enabled += sqlite3_column_int64(st, 1);
+      ++polls;
+    }
+    sqlite3_finalize(st);
+  }
+  sqlite3_close(reader);
+  ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
+  EXPECT_EQ(enabled, 0) << "in " << polls << " polls";
+  EXPECT_GT(polls, 100);
+  EXPECT_GT(seen, 0);
+  CapturedRun list = Hfstore({"list"});
+  EXPECT_EQ(std::count(list.out.begin(), list.out.end(), '\n'), 300);
+  EXPECT_EQ(list.out.find("enabled\t"), std::string::npos);
+}
+
 // Another application's SQLite database.
 void WriteSqlite(const fs::path& file, const char* sql) {
   fs::create_directories(file.parent_path());

@@ -80,12 +80,12 @@ std::size_t SettingColumnCount() {
 
 struct StoreWriter::Statements {
   Statement begin, commit, rollback, find, insert_folder, insert_folder_config, insert_filter,
-      insert_job, insert_impose, insert_preflight, disable;
+      insert_job, insert_impose, insert_preflight, enabled, disable;
 
   bool Prepare(sqlite3* db) {
     std::string folder_sql = "INSERT INTO hot_folder(enabled, " + SettingColumns() +
-                             ", FilterConfiguration) VALUES(1, " +
-                             Placeholders(SettingColumnCount() + 1) + ")";
+                             ", FilterConfiguration) VALUES(" +
+                             Placeholders(SettingColumnCount() + 2) + ")";
     std::string config_sql = "INSERT INTO folder_configuration(hot_folder, " + FolderColumns() +
                              ") VALUES(" + Placeholders(std::size(kFolderFields) + 1) + ")";
     return begin.Prepare(db, "BEGIN IMMEDIATE") && commit.Prepare(db, "COMMIT") &&
@@ -104,6 +104,7 @@ struct StoreWriter::Statements {
            insert_preflight.Prepare(db,
                                     "INSERT INTO preflight_entry(hot_folder, position, First,"
                                     " Second) VALUES(?, ?, ?, ?)") &&
+           enabled.Prepare(db, "SELECT enabled FROM hot_folder WHERE FolderPath = ?") &&
            disable.Prepare(db, "UPDATE hot_folder SET enabled = 0 WHERE FolderPath = ?");
   }
 };
@@ -190,10 +191,11 @@ bool StoreWriter::OpenExisting(const StoreLocation& location) {
   return EnsureOpen(location, /*create=*/false);
 }
 
-CreateResult StoreWriter::Create(const StoreLocation& location, const HotFolderRecords& records) {
+CreateResult StoreWriter::Create(const StoreLocation& location, const HotFolderRecords& records,
+                                 bool enabled) {
   if (!EnsureOpen(location, /*create=*/true)) return CreateResult::kFailed;
   bool duplicate = false;
-  if (Insert(records, &duplicate)) return CreateResult::kCreated;
+  if (Insert(records, enabled, &duplicate)) return CreateResult::kCreated;
   if (duplicate) return CreateResult::kAlreadyRegistered;
   Close();
   return CreateResult::kFailed;
@@ -201,6 +203,21 @@ CreateResult StoreWriter::Create(const StoreLocation& location, const HotFolderR
 
 bool StoreWriter::Disable(const StoreLocation& location, const wxString& folder_path) {
   if (!EnsureOpen(location, /*create=*/false)) return false;
+  // A folder created disabled needs no second commit.
+  Statement& enabled = statements_->enabled;
+  if (!enabled.BindText(1, folder_path)) {
+    Close();
+    return false;
+  }
+  const bool found = enabled.Step();
+  const bool failed = enabled.Failed();
+  const bool already = found && enabled.ColumnInt(0) == 0;
+  enabled.Reset();
+  if (failed) {
+    Close();
+    return false;
+  }
+  if (!found || already) return found;
   Statement& disable = statements_->disable;
   if (!disable.BindText(1, folder_path) || !disable.Run()) {
     Close();
@@ -209,15 +226,33 @@ bool StoreWriter::Disable(const StoreLocation& location, const wxString& folder_
   return sqlite3_changes(db_.get()) > 0;
 }
 
-bool StoreWriter::Insert(const HotFolderRecords& records, bool* duplicate) {
+Registration StoreWriter::Find(const StoreLocation& location, const wxString& folder_path) {
+  FileState state = Classify(std::filesystem::path(location.file));
+  if (state == FileState::kMissing || state == FileState::kEmpty) {
+    return Registration::kNotRegistered;
+  }
+  if (!EnsureOpen(location, /*create=*/false)) return Registration::kUnknown;
+  Statement& find = statements_->find;
+  if (!find.BindText(1, folder_path)) return Registration::kUnknown;
+  const bool found = find.Step();
+  const bool failed = find.Failed();
+  find.Reset();
+  if (failed) {
+    Close();
+    return Registration::kUnknown;
+  }
+  return found ? Registration::kRegistered : Registration::kNotRegistered;
+}
+
+bool StoreWriter::Insert(const HotFolderRecords& records, bool enabled, bool* duplicate) {
   Statements& s = *statements_;
   if (!s.begin.Run()) return false;
-  if (InsertRecords(records, duplicate) && s.commit.Run()) return true;
+  if (InsertRecords(records, enabled, duplicate) && s.commit.Run()) return true;
   if (sqlite3_get_autocommit(db_.get()) == 0) s.rollback.Run();
   return false;
 }
 
-bool StoreWriter::InsertRecords(const HotFolderRecords& records, bool* duplicate) {
+bool StoreWriter::InsertRecords(const HotFolderRecords& records, bool enabled, bool* duplicate) {
   Statements& s = *statements_;
   const Setting& setting = records.setting;
   if (!s.find.BindText(1, setting.FolderPath)) return false;
@@ -228,8 +263,8 @@ bool StoreWriter::InsertRecords(const HotFolderRecords& records, bool* duplicate
 
   std::string filter_xml;
   if (!FilterXmlText(records.filter, &filter_xml)) return false;
-  bool ok = true;
   int index = 0;
+  bool ok = s.insert_folder.BindInt(++index, enabled ? 1 : 0);
   for (const SettingField& field : kSettingFields) {
     switch (field.kind) {
       case FieldKind::kText:

@@ -33,6 +33,8 @@ struct StoreLocation {
 
 enum class CreateResult { kCreated, kAlreadyRegistered, kFailed };
 
+enum class Registration { kRegistered, kNotRegistered, kUnknown };
+
 class StoreWriter {
  public:
   StoreWriter();
@@ -41,13 +43,20 @@ class StoreWriter {
   // Both calls (re)open the database at `file` when it is not the one open,
   // or when the last call failed. A failure closes the connection so that
   // the next call starts afresh.
-  CreateResult Create(const StoreLocation& location, const HotFolderRecords& records);
+  // The folder is stored with the given enabled state in the same
+  // transaction as its records, so that nobody ever sees another state.
+  CreateResult Create(const StoreLocation& location, const HotFolderRecords& records,
+                      bool enabled);
   // Opens the database at `file` when it exists and is ours, creating
   // nothing, so that the next Create is only its own transaction.
   bool OpenExisting(const StoreLocation& location);
   // False for an unknown folder path as well as for a failure. A missing
-  // database holds no folder, so it is not created for this.
+  // database holds no folder, so it is not created for this. A folder that
+  // is disabled already answers true without a write.
   bool Disable(const StoreLocation& location, const wxString& folder_path);
+  // Whether a folder of that path is stored. A missing or empty database
+  // holds none; one that cannot be read answers kUnknown.
+  Registration Find(const StoreLocation& location, const wxString& folder_path);
   // Whether a connection is open, as the last call left it.
   bool IsOpen() const { return db_ != nullptr; }
 
@@ -56,8 +65,8 @@ class StoreWriter {
 
   bool EnsureOpen(const StoreLocation& location, bool create);
   bool Open(const StoreLocation& location, bool create);
-  bool Insert(const HotFolderRecords& records, bool* duplicate);
-  bool InsertRecords(const HotFolderRecords& records, bool* duplicate);
+  bool Insert(const HotFolderRecords& records, bool enabled, bool* duplicate);
+  bool InsertRecords(const HotFolderRecords& records, bool enabled, bool* duplicate);
   void Close();
 
   // Which file is open: the path, and the file's identity on hosts where
