@@ -2,15 +2,21 @@
 //
 //   hfbench_floor plan STORE          what a migration wrote, per folder:
 //                                     "path<TAB>rows<TAB>bytes" on stdout
-//   hfbench_floor run PREFIX PLAN     for each planned folder: read its
-//                                     folder.cfg, move its settings directory,
-//                                     and commit as many rows of as many bytes
-//                                     in one durable transaction
+//   hfbench_floor run PREFIX PLAN     record the planned folders durably in
+//                                     one file; then for each: read its
+//                                     folder.cfg, move its settings directory
+//                                     and sync its directory, and commit as
+//                                     many rows of as many bytes in one
+//                                     durable transaction; remove the record
 //
 // The plan is taken from a store a real migration wrote, so the floor writes
-// what the tool writes and nothing is guessed; a folder that was registered
-// and then disabled counts one row more, the update.
+// what the tool writes and nothing is guessed. A migration that an
+// interrupted run must be able to finish cannot do less: the run's record is
+// one durable write, and each move must be on the disk before the commit
+// that follows it.
+#include <fcntl.h>
 #include <sqlite3.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <filesystem>
@@ -26,7 +32,7 @@ namespace {
 // Rows and text bytes per hot folder, over every table the store fills.
 const char kPlanSql[] =
     "SELECT h.FolderPath,"
-    " 2 + (h.enabled = 0)"
+    " 2"
     " + (SELECT count(*) FROM filter_entry WHERE hot_folder = h.id)"
     " + (SELECT count(*) FROM job_setting WHERE hot_folder = h.id)"
     " + (SELECT count(*) FROM impose_setting WHERE hot_folder = h.id)"
@@ -105,6 +111,26 @@ struct Writer {
   }
 };
 
+bool SyncDirectory(const fs::path& dir) {
+  int fd = open(dir.c_str(), O_RDONLY | O_DIRECTORY);
+  bool synced = fd >= 0 && fsync(fd) == 0;
+  if (fd >= 0) close(fd);
+  return synced;
+}
+
+// The plan's folders written to a file beside the store, flushed, renamed
+// into place and its directory synced: one durable commit for the run.
+bool WriteRecord(const fs::path& file, const std::string& text) {
+  const fs::path temporary = file.string() + ".new";
+  int fd = open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0666);
+  bool written = fd >= 0 &&
+                 write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) &&
+                 fsync(fd) == 0;
+  if (fd >= 0) close(fd);
+  return written && rename(temporary.c_str(), file.c_str()) == 0 &&
+         SyncDirectory(file.parent_path());
+}
+
 bool ReadWhole(const fs::path& file, std::string* bytes) {
   std::ifstream in(file, std::ios::binary);
   std::ostringstream text;
@@ -115,9 +141,14 @@ bool ReadWhole(const fs::path& file, std::string* bytes) {
 
 int Run(const fs::path& prefix, const char* plan_file) {
   std::ifstream plan(plan_file);
+  std::ostringstream plan_text;
+  plan_text << plan.rdbuf();
+  plan.clear();
+  plan.seekg(0);
+  const fs::path store_dir = prefix / "drive_c" / "ProgramData" / "KYR" / "Dirorodiv";
   Writer writer;
-  if (!plan ||
-      !writer.Open(prefix / "drive_c" / "ProgramData" / "KYR" / "Dirorodiv" / "HotFolders.db")) {
+  if (!plan || !writer.Open(store_dir / "HotFolders.db") ||
+      !WriteRecord(store_dir / "run.record", plan_text.str())) {
     std::fprintf(stderr, "hfbench_floor: cannot start\n");
     return 1;
   }
@@ -133,9 +164,9 @@ int Run(const fs::path& prefix, const char* plan_file) {
     std::error_code error;
     if (!ReadWhole(dir / "[_KYR_HotFolder_]" / "folder.cfg", &config)) return 1;
     fs::rename(dir / "[_KYR_HotFolder_]", dir / "[_KYR_HotFolder_Old]", error);
-    if (error || !writer.Commit(++folder, rows, bytes)) return 1;
+    if (error || !SyncDirectory(dir) || !writer.Commit(++folder, rows, bytes)) return 1;
   }
-  return 0;
+  return fs::remove(store_dir / "run.record") ? 0 : 1;
 }
 
 }  // namespace

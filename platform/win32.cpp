@@ -163,10 +163,10 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
 // entries, a rename inside it included, to the disk.
 bool SyncDirectory(const std::wstring& windows_path) {
   if (HasNul(windows_path)) return false;
-  ScopedHandle directory(FileHandle(CreateFileW(
-      windows_path.c_str(), GENERIC_READ | GENERIC_WRITE,
-      FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING,
-      FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
+  ScopedHandle directory(
+      FileHandle(CreateFileW(windows_path.c_str(), GENERIC_READ | GENERIC_WRITE,
+                             FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+                             OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
   if (directory.get() == nullptr) return false;
   return FlushFileBuffers(directory.get()) != 0;
 }

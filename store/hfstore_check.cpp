@@ -39,7 +39,7 @@ const char* EnabledWord(bool enabled) {
 
 struct Sources {
   std::map<wxString, const StoredHotFolder*> stored;  // by folder path
-  std::set<wxString> recorded;  // folders an interrupted run was retiring
+  std::set<wxString> recorded;                        // folders an interrupted run was retiring
 };
 
 FolderCheck CheckFolder(const Sources& sources, const wxString& folder, bool listed_enabled) {
@@ -153,7 +153,8 @@ int RunCheck(const platform::HostPath& store_file, bool json) {
   int counts[kResults] = {};
   bool ok = true;
   for (std::size_t i = 0; i < engine.m_Folders.size(); ++i) {
-    const bool listed_enabled = i >= engine.m_EnabledFlags.size() || engine.m_EnabledFlags[i] != "0";
+    const bool listed_enabled =
+        i >= engine.m_EnabledFlags.size() || engine.m_EnabledFlags[i] != "0";
     checks.push_back(CheckFolder(sources, engine.m_Folders[i], listed_enabled));
     ++counts[checks.back().result];
     ok = ok && !checks.back().counts_against;

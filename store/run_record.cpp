@@ -2,6 +2,7 @@
 
 #include <cinttypes>
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <sstream>
@@ -118,7 +119,7 @@ RunRecordState ReadRunRecord(std::vector<RunRecordEntry>* entries) {
     // Something else under the name (a directory) is no record either.
     return platform::DirectoryExists(path) ? RunRecordState::kDamaged : RunRecordState::kNone;
   }
-  std::ifstream in(platform::ToHostPath(path), std::ios::binary);
+  std::ifstream in(std::filesystem::path(platform::ToHostPath(path)), std::ios::binary);
   std::string bytes;
   char buffer[1 << 16];
   while (in.read(buffer, sizeof buffer) || in.gcount() > 0) {

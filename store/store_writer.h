@@ -42,11 +42,10 @@ class StoreWriter {
 
   // Both calls (re)open the database at `file` when it is not the one open,
   // or when the last call failed. A failure closes the connection so that
-  // the next call starts afresh.
-  // The folder is stored with the given enabled state in the same
-  // transaction as its records, so that nobody ever sees another state.
-  CreateResult Create(const StoreLocation& location, const HotFolderRecords& records,
-                      bool enabled);
+  // the next call starts afresh. Create stores the folder with the given
+  // enabled state in the transaction of its records, so that nobody ever
+  // sees it in another state.
+  CreateResult Create(const StoreLocation& location, const HotFolderRecords& records, bool enabled);
   // Opens the database at `file` when it exists and is ours, creating
   // nothing, so that the next Create is only its own transaction.
   bool OpenExisting(const StoreLocation& location);
