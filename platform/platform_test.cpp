@@ -9,6 +9,7 @@
 #include <cwctype>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -207,6 +208,31 @@ TEST(FileTest, MoveNeverReplacesAnExistingDirectory) {
   EXPECT_FALSE(platform::DirectoryExists(scratch.Path(L"old")));
   EXPECT_TRUE(platform::FileExists(scratch.Path(L"new\\folder.cfg")));
   EXPECT_FALSE(platform::MoveDirectory(scratch.Path(L"missing"), scratch.Path(L"other")));
+}
+
+// The run record's file services: a whole new file or none, no replacing
+// rename, removal that leaves nothing, and synced directories.
+TEST(FileTest, DurableFilesRenamesAndRemovals) {
+  Scratch scratch;
+  const std::wstring file = scratch.Path(L"run"), aside = scratch.Path(L"run.aside");
+  const auto read = [](const std::wstring& path) {
+    std::ifstream in(fs::path(platform::ToHostPath(path)), std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), {});
+  };
+  ASSERT_TRUE(platform::ReplaceFileDurably(file, "first"));
+  ASSERT_TRUE(platform::ReplaceFileDurably(file, "second"));
+  EXPECT_FALSE(platform::FileExists(file + L".new"));
+  scratch.Write(L"taken", "taken");
+  EXPECT_FALSE(platform::RenameFile(file, scratch.Path(L"taken")));
+  EXPECT_TRUE(platform::RenameFile(file, aside));
+  EXPECT_EQ(read(aside) + read(scratch.Path(L"taken")), "secondtaken");
+  EXPECT_TRUE(platform::RemoveFile(aside));
+  EXPECT_TRUE(platform::RemoveFile(aside));  // none left is what was asked
+  ASSERT_TRUE(platform::CreateDirectories(scratch.Path(L"dir")));
+  EXPECT_FALSE(platform::RemoveFile(scratch.Path(L"dir")));
+  EXPECT_TRUE(platform::SyncDirectory(scratch.Path(L"dir")));
+  EXPECT_FALSE(platform::SyncDirectory(scratch.Path(L"missing")));
+  EXPECT_FALSE(platform::ReplaceFileDurably(scratch.Path(L"missing\\run"), "x"));
 }
 
 // The stand-in holds the server's mutex while it runs, so no other process

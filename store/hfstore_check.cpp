@@ -74,6 +74,11 @@ FolderCheck CheckFolder(const Sources& sources, const wxString& folder, bool lis
     check.counts_against = true;
   } else {
     check.detail = "no folder.cfg at " + config;
+    // Retired by someone else (an earlier tool, a person): hfmigrate will
+    // not touch it, and says so.
+    if (platform::DirectoryExists(paths.retired.ToStdWstring())) {
+      check.detail += "; " + paths.retired + " is left alone: no interrupted run retired it";
+    }
   }
   return check;
 }

@@ -69,7 +69,9 @@ bool ReadEntry(const std::string& bytes, std::size_t* pos, RunRecordEntry* entry
 
 }  // namespace
 
+// Empty when the all-users folder is unknown: the record then has no place.
 std::wstring RunRecordPath() {
+  if (platform::CommonAppDataFolder().empty()) return std::wstring();
   return StoreFolder() + kFileName;
 }
 
@@ -115,6 +117,7 @@ bool DecodeRunRecord(const std::string& bytes, std::vector<RunRecordEntry>* entr
 RunRecordState ReadRunRecord(std::vector<RunRecordEntry>* entries) {
   entries->clear();
   const std::wstring path = RunRecordPath();
+  if (path.empty()) return RunRecordState::kNone;
   if (!platform::FileExists(path)) {
     // Something else under the name (a directory) is no record either.
     return platform::DirectoryExists(path) ? RunRecordState::kDamaged : RunRecordState::kNone;
@@ -132,16 +135,19 @@ RunRecordState ReadRunRecord(std::vector<RunRecordEntry>* entries) {
 
 bool WriteRunRecord(const std::vector<RunRecordEntry>& entries) {
   const std::wstring folder = StoreFolder();
+  if (RunRecordPath().empty()) return false;
   if (!platform::DirectoryExists(folder) && !platform::CreateDirectories(folder)) return false;
   return platform::ReplaceFileDurably(RunRecordPath(), EncodeRunRecord(entries));
 }
 
 bool RemoveRunRecord() {
-  return platform::RemoveFile(RunRecordPath());
+  const std::wstring path = RunRecordPath();
+  return path.empty() || platform::RemoveFile(path);
 }
 
 bool SetAsideRunRecord() {
   const std::wstring path = RunRecordPath();
+  if (path.empty()) return false;
   for (int n = 1; n <= 100; ++n) {
     std::wstring aside = path + kDamagedSuffix;
     if (n > 1) aside += L"-" + std::to_wstring(n);

@@ -32,7 +32,8 @@ const Row kRows[] = {
     {"C", true, -1, false, false, false,
      "not migrated\tD:\\Jobs\\C\tno folder.cfg at D:\\Jobs\\C\\[_KYR_HotFolder_]\\folder.cfg"},
     {"D", true, -1, false, true, false,  // retired by someone else
-     "not migrated\tD:\\Jobs\\D\tno folder.cfg at D:\\Jobs\\D\\[_KYR_HotFolder_]\\folder.cfg"},
+     "not migrated\tD:\\Jobs\\D\tno folder.cfg at D:\\Jobs\\D\\[_KYR_HotFolder_]\\folder.cfg; "
+     "D:\\Jobs\\D\\[_KYR_HotFolder_Old] is left alone: no interrupted run retired it"},
     {"E", true, -1, true, false, false,
      "not migrated\tD:\\Jobs\\E\tnot registered; its settings are still at "
      "D:\\Jobs\\E\\[_KYR_HotFolder_]\\folder.cfg"},
