@@ -1,6 +1,7 @@
 // The built hfmigrate killed at random moments of a long migration and run
 // again, as a print shop whose machine loses power would run it; some kills
-// land while a rerun is finishing the interrupted run. Between kills
+// land while a rerun is finishing the interrupted run, having put back the
+// settings that run retired but never registered. Between kills
 // hfstore check names exactly the folders left interrupted, and no folder
 // is ever stored with another enabled state than listed. In the end every
 // legacy folder is migrated once, whole, as listed, with its settings
@@ -99,15 +100,17 @@ bool Whole(const StoredHotFolder& stored, int i) {
 
 // After a kill: hfstore check names exactly the folders whose settings are
 // retired but not stored, and nothing is stored in another state than
-// listed. Answers how many folders are interrupted.
-int CheckBetweenKills(const Installation& installation) {
+// listed. Answers the interrupted folders.
+std::vector<int> CheckBetweenKills(const Installation& installation) {
   const auto stored = StoredByPath();
   std::set<std::string> interrupted;
+  std::vector<int> numbers;
   int pending = 0;
   for (int i = 0; i < kFolders; ++i) {
     pending += installation.Has(i, "[_KYR_HotFolder_]");
     if (!installation.Has(i, "[_KYR_HotFolder_]") && !stored.count(FolderPath(i))) {
       interrupted.insert(FolderPath(i));
+      numbers.push_back(i);
     }
   }
   CapturedRun run = RunCaptured(BinDir() + "/hfstore", {"check", "--json"});
@@ -125,23 +128,18 @@ int CheckBetweenKills(const Installation& installation) {
     EXPECT_TRUE(folders.size() == 1 && Whole(folders[0], i)) << path;
   }
   EXPECT_TRUE(installation.KeptUntouched());
-  return static_cast<int>(interrupted.size());
+  return numbers;
 }
 
 // Picks the moment of the next kill: anywhere from start-up to the end of
 // an even share of the remaining folders, so that the kills are spread over
-// the whole migration; when a run starts with interrupted folders to put
-// back, now and then right around the end of start-up, where it does that.
+// the whole migration.
 struct Schedule {
   std::mt19937 random{std::random_device{}()};
   double startup_seconds = 0.1;
   double per_folder_seconds = 0.005;
 
-  double NextDelay(int remaining, int kills_left, bool recovering) {
-    if (recovering && random() % 3 == 0) {
-      return std::uniform_real_distribution<double>(0.9 * startup_seconds,
-                                                    startup_seconds + 0.01)(random);
-    }
+  double NextDelay(int remaining, int kills_left) {
     double share = static_cast<double>(remaining) / (kills_left + 1);
     return std::uniform_real_distribution<double>(
         0, startup_seconds + share * per_folder_seconds)(random);
@@ -164,24 +162,32 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
   schedule.startup_seconds = RunProgram(tool).seconds;
   fs::rename(list.string() + ".away", list);
 
-  int kills = 0, recovery_kills = 0, interrupted = 0, most_interrupted = 0;
+  int kills = 0, recovery_kills = 0, most_interrupted = 0;
+  std::vector<int> interrupted;
   for (int attempt = 0; kills < kKillsAimedAt && attempt < 4 * kKillsAimedAt; ++attempt) {
     int before = installation.CountRetired();
-    if (before == kFolders && interrupted == 0) break;
+    if (before == kFolders && interrupted.empty()) break;
     const std::string record = installation.Record();
-    double delay = schedule.NextDelay(kFolders - before, kKillsAimedAt - kills, interrupted > 0);
+    double delay = schedule.NextDelay(kFolders - before, kKillsAimedAt - kills);
+    // Every other rerun that has an interrupted folder to put back is killed
+    // the moment it has put it back, while it finishes the interrupted run.
+    const bool in_recovery = !interrupted.empty() && schedule.random() % 2 == 0;
     pid_t pid = StartProgram(tool);
     ASSERT_GT(pid, 0);
-    std::this_thread::sleep_for(std::chrono::duration<double>(delay));
+    const auto start = std::chrono::steady_clock::now();
+    while (in_recovery && !installation.Has(interrupted[0], "[_KYR_HotFolder_]") &&
+           std::chrono::steady_clock::now() - start < std::chrono::seconds(10)) {
+    }
+    if (!in_recovery) std::this_thread::sleep_for(std::chrono::duration<double>(delay));
     kill(pid, SIGKILL);
     if (WaitProgram(pid) != -1) continue;  // a run that ended first was not killed
     ++kills;
-    // Killed before its own record replaced the one it was finishing.
-    recovery_kills += interrupted > 0 && delay > 0.9 * schedule.startup_seconds &&
-                      installation.Record() == record;
-    schedule.Learn(delay, installation.CountRetired() - before);
+    // Killed after putting settings back, before its own record replaced
+    // the one it was finishing.
+    recovery_kills += in_recovery && installation.Record() == record;
+    if (!in_recovery) schedule.Learn(delay, installation.CountRetired() - before);
     interrupted = CheckBetweenKills(installation);
-    most_interrupted = std::max(most_interrupted, interrupted);
+    most_interrupted = std::max(most_interrupted, static_cast<int>(interrupted.size()));
     if (::testing::Test::HasFailure()) return;
   }
   EXPECT_GE(kills, kKills);
