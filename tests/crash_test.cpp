@@ -162,31 +162,45 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
   schedule.startup_seconds = RunProgram(tool).seconds;
   fs::rename(list.string() + ".away", list);
 
-  int kills = 0, recovery_kills = 0, most_interrupted = 0;
+  int kills = 0, recovery_kills = 0, move_kills = 0, most_interrupted = 0;
   std::vector<int> interrupted;
   for (int attempt = 0; kills < kKillsAimedAt && attempt < 4 * kKillsAimedAt; ++attempt) {
     int before = installation.CountRetired();
     if (before == kFolders && interrupted.empty()) break;
     const std::string record = installation.Record();
     double delay = schedule.NextDelay(kFolders - before, kKillsAimedAt - kills);
-    // Every other rerun that has an interrupted folder to put back is killed
-    // the moment it has put it back, while it finishes the interrupted run.
+    // Besides kills at random moments, some at the two moments that matter:
+    // just after a move, before its commit (this leaves a folder
+    // interrupted), and while a rerun finishes an interrupted run, the
+    // moment it has put the settings back.
     const bool in_recovery = !interrupted.empty() && schedule.random() % 2 == 0;
+    const bool after_move = interrupted.empty() && schedule.random() % 4 == 0;
+    int next = 0;
+    while (next < kFolders && !installation.Has(next, "[_KYR_HotFolder_]")) ++next;
     pid_t pid = StartProgram(tool);
     ASSERT_GT(pid, 0);
     const auto start = std::chrono::steady_clock::now();
-    while (in_recovery && !installation.Has(interrupted[0], "[_KYR_HotFolder_]") &&
-           std::chrono::steady_clock::now() - start < std::chrono::seconds(10)) {
+    const auto waiting = [&] {
+      return std::chrono::steady_clock::now() - start < std::chrono::seconds(10);
+    };
+    if (in_recovery) {
+      while (!installation.Has(interrupted[0], "[_KYR_HotFolder_]") && waiting()) {
+      }
+    } else if (after_move && next < kFolders) {
+      while (installation.Has(next, "[_KYR_HotFolder_]") && waiting()) {
+      }
+    } else {
+      std::this_thread::sleep_for(std::chrono::duration<double>(delay));
     }
-    if (!in_recovery) std::this_thread::sleep_for(std::chrono::duration<double>(delay));
     kill(pid, SIGKILL);
     if (WaitProgram(pid) != -1) continue;  // a run that ended first was not killed
     ++kills;
     // Killed after putting settings back, before its own record replaced
     // the one it was finishing.
     recovery_kills += in_recovery && installation.Record() == record;
-    if (!in_recovery) schedule.Learn(delay, installation.CountRetired() - before);
+    if (!in_recovery && !after_move) schedule.Learn(delay, installation.CountRetired() - before);
     interrupted = CheckBetweenKills(installation);
+    move_kills += after_move && !interrupted.empty();
     most_interrupted = std::max(most_interrupted, static_cast<int>(interrupted.size()));
     if (::testing::Test::HasFailure()) return;
   }
@@ -211,9 +225,9 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
   CapturedRun check = RunCaptured(BinDir() + "/hfstore", {"check"});
   EXPECT_EQ(check.status, 0) << check.out.substr(check.out.rfind('\n', check.out.size() - 2));
   std::printf(
-      "[   KILLS  ] %d kills, %d while finishing an interrupted run; at most %d folders"
-      " interrupted at once\n",
-      kills, recovery_kills, most_interrupted);
+      "[   KILLS  ] %d kills: %d between a move and its commit, %d while finishing an"
+      " interrupted run; at most %d folders interrupted at once\n",
+      kills, move_kills, recovery_kills, most_interrupted);
 }
 
 }  // namespace
