@@ -4,8 +4,6 @@
 #ifndef HF_CONVERT_HOST_RESOLVER_H_
 #define HF_CONVERT_HOST_RESOLVER_H_
 
-#include <wx/string.h>
-
 #include <string>
 
 struct HostResolver {
@@ -15,10 +13,9 @@ struct HostResolver {
   bool (*host_by_ipv4_address)(const std::string& dotted, std::string* official_name);
 };
 
-// The platform layer's services.
-const HostResolver& SystemHostResolver();
-
-// ResolveServerName with the given services.
-bool ResolveServerNameWith(const HostResolver& resolver, const wxString& address, wxString& name);
+// Puts `resolver` in place of the platform layer's services for every
+// ResolveServerName that follows; null puts the platform's back. This is the
+// one way a test or a fuzz target answers name lookups itself.
+void UseHostResolver(const HostResolver* resolver);
 
 #endif  // HF_CONVERT_HOST_RESOLVER_H_

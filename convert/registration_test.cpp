@@ -188,15 +188,16 @@ TEST(ResolveServerNameTest, DispatchAndShortName) {
       // U+0141 must not become 'A' (0x41) and name another host.
       {true, nullptr, nullptr, L"\u0141odz", nullptr, "addr:?odz;"},
   };
+  UseHostResolver(&kFakeResolver);
   for (const ResolveCase& c : cases) {
     const auto& [sockets, local, remote, address, resolved, queries] = c;
     g_case = &c;
     g_queries.clear();
     wxString name = "legacy";
-    EXPECT_EQ(ResolveServerNameWith(kFakeResolver, address, name), resolved != nullptr)
-        << wxString(address);
+    EXPECT_EQ(ResolveServerName(address, name), resolved != nullptr) << wxString(address);
     EXPECT_EQ(name + " " + g_queries, wxString(resolved ? resolved : "legacy") + " " + queries);
   }
+  UseHostResolver(nullptr);
 }
 
 TEST_F(RegistrationTest, StoreServerJobsAndSecondRegistration) {

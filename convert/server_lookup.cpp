@@ -42,13 +42,20 @@ bool IsLocalHost(const wxString& address) {
 
 }  // namespace
 
-const HostResolver& SystemHostResolver() {
-  static const HostResolver resolver = {platform::StartSockets, platform::LocalHostName,
-                                        platform::HostByName, platform::HostByIPv4Address};
-  return resolver;
+namespace {
+
+const HostResolver kSystemResolver = {platform::StartSockets, platform::LocalHostName,
+                                      platform::HostByName, platform::HostByIPv4Address};
+const HostResolver* g_resolver = &kSystemResolver;
+
+}  // namespace
+
+void UseHostResolver(const HostResolver* resolver) {
+  g_resolver = resolver ? resolver : &kSystemResolver;
 }
 
-bool ResolveServerNameWith(const HostResolver& resolver, const wxString& address, wxString& name) {
+bool ResolveServerName(const wxString& address, wxString& name) {
+  const HostResolver& resolver = *g_resolver;
   if (!resolver.start_sockets()) return false;
   std::string bytes = ToSingleBytes(address);
 
@@ -72,10 +79,6 @@ bool ResolveServerNameWith(const HostResolver& resolver, const wxString& address
   if (!FromMultibyte(official, &full)) return false;
   name = full.BeforeFirst('.');
   return true;
-}
-
-bool ResolveServerName(const wxString& address, wxString& name) {
-  return ResolveServerNameWith(SystemHostResolver(), address, name);
 }
 
 const wxString& CachedServerDirectory(std::optional<wxString>& cache) {

@@ -1,16 +1,12 @@
-// The name services of the platform layer, answered from a small table
-// instead of the system resolver. A fuzzed folder.cfg names arbitrary
-// servers; asking real name servers for them would make every run as slow
-// and as unrepeatable as the network, and send junk queries to it.
-//
-// The fuzz target that links this file gets these definitions instead of
-// the platform library's posix_network.cpp, which the linker then has no
-// reason to pull in.
+// Name lookups answered from a small table instead of the system resolver.
+// A fuzzed folder.cfg names arbitrary servers; asking real name servers for
+// them would make every run as slow and as unrepeatable as the network, and
+// send junk queries to it. The target that links this file puts the table in
+// place before its first input.
 #include <string>
 
-#include "platform/platform.h"
+#include "convert/host_resolver.h"
 
-namespace platform {
 namespace {
 
 // A few hosts by name or dotted address, with their official names.
@@ -20,23 +16,18 @@ bool Look(const std::string& name, std::string* official) {
   return name == "press-01" || name == "PRESS-01" || name == "10.0.0.5";
 }
 
+const HostResolver kOfflineResolver = {
+    [] { return true; },
+    [](std::string* name) {
+      *name = "fuzzhost.print.example";
+      return true;
+    },
+    Look,
+    Look,
+};
+
+// Runs at start-up. The pointer it sets is constant-initialised, before any
+// start-up code runs, so the order of start-up does not matter.
+[[maybe_unused]] const bool kInPlace = (UseHostResolver(&kOfflineResolver), true);
+
 }  // namespace
-
-bool StartSockets() {
-  return true;
-}
-
-bool LocalHostName(std::string* name) {
-  *name = "fuzzhost.print.example";
-  return true;
-}
-
-bool HostByName(const std::string& name, std::string* official_name) {
-  return Look(name, official_name);
-}
-
-bool HostByIPv4Address(const std::string& dotted, std::string* official_name) {
-  return Look(dotted, official_name);
-}
-
-}  // namespace platform

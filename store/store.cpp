@@ -20,16 +20,17 @@ std::string EnvironmentValue(const char* name) {
   return value == nullptr ? std::string() : std::string(value);
 }
 
-// Mapping the fixed location walks the prefix's directories, which cost more
-// than the rest of a call. The prefix may change between calls (tests switch
-// it), so the mapping is kept per prefix, and only while the writer holds
-// the store open: a store that is gone is looked for afresh, under whatever
-// names its directories now have.
 // The folder path announced by CreateNextDisabled, until the next creation.
 std::optional<wxString>& NextDisabled() {
   static std::optional<wxString> path;
   return path;
 }
+
+// Mapping the fixed location walks the prefix's directories, which cost more
+// than the rest of a call. The prefix may change between calls (tests switch
+// it), so the mapping is kept per prefix, and only while the writer holds
+// the store open: a store that is gone is looked for afresh, under whatever
+// names its directories now have.
 
 const db::StoreLocation& Location() {
   static std::string prefix, home;
@@ -106,4 +107,8 @@ bool RODuriZudaze::DisableHotFolder(const wxString& folderPath) {
   } catch (...) {
     return false;
   }
+}
+
+void RODuriZudaze::Close() {
+  Writer().Close();
 }

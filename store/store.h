@@ -39,6 +39,11 @@ class RODuriZudaze {
   // cannot be read. Creates nothing.
   Registration FindHotFolder(const wxString& folderPath);
 
+  // Lets go of the store's connection, which is otherwise kept from one call
+  // to the next; the next call opens the store afresh. For a process that
+  // moves from one store to another: the tests and the fuzz target.
+  void Close();
+
  private:
   RODuriZudaze() = default;
 };

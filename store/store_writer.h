@@ -58,6 +58,8 @@ class StoreWriter {
   Registration Find(const StoreLocation& location, const wxString& folder_path);
   // Whether a connection is open, as the last call left it.
   bool IsOpen() const { return db_ != nullptr; }
+  // Lets go of the connection and its statements.
+  void Close();
 
  private:
   struct Statements;
@@ -66,7 +68,6 @@ class StoreWriter {
   bool Open(const StoreLocation& location, bool create);
   bool Insert(const HotFolderRecords& records, bool enabled, bool* duplicate);
   bool InsertRecords(const HotFolderRecords& records, bool enabled, bool* duplicate);
-  void Close();
 
   // Which file is open: the path, and the file's identity on hosts where
   // an open file can be deleted or replaced under the same name.
