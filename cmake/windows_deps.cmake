@@ -15,14 +15,9 @@ find_package(SQLite3 REQUIRED)
 find_package(EXPAT REQUIRED)
 set_property(TARGET EXPAT::EXPAT APPEND PROPERTY INTERFACE_COMPILE_DEFINITIONS XML_STATIC)
 
-# JSON is header-only: its headers are the same on every host, so the host's
-# copy is used, seen apart from the host's other headers.
-find_path(HF_JSON_INCLUDE nlohmann/json.hpp PATHS /usr/include NO_CMAKE_FIND_ROOT_PATH
-          REQUIRED)
-file(COPY ${HF_JSON_INCLUDE}/nlohmann DESTINATION ${CMAKE_BINARY_DIR}/json/include)
+# JSON is header-only, installed into the prefix from its source package.
 add_library(nlohmann_json::nlohmann_json INTERFACE IMPORTED)
-target_include_directories(nlohmann_json::nlohmann_json SYSTEM
-                           INTERFACE ${CMAKE_BINARY_DIR}/json/include)
+target_include_directories(nlohmann_json::nlohmann_json SYSTEM INTERFACE ${HF_WIN64_DEPS}/include)
 
 # GoogleTest from Debian's source package, built with the same compiler.
 set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Cross-builds the Windows dependencies from Debian 12 source packages into
 # static libraries: wxWidgets 3.2 (MSW port, base and xml only), expat, zlib
-# and SQLite. The result lands in a cache outside the work tree, keyed by the
+# and SQLite, with the header-only JSON library beside them. The result lands in a cache outside the work tree, keyed by the
 # source package versions, the compiler and this script, and is reused when
 # present. Prints the dependency prefix on standard output; all else goes to
 # standard error.
@@ -10,7 +10,7 @@ set -euo pipefail
 host=x86_64-w64-mingw32
 cc=$host-gcc-posix
 cxx=$host-g++-posix
-packages=(wxwidgets3.2 expat zlib sqlite3)
+packages=(wxwidgets3.2 expat zlib sqlite3 nlohmann-json3)
 jobs="$(nproc)"
 
 cache="${XDG_CACHE_HOME:-$HOME/.cache}/hfmigrate-win64"
@@ -221,7 +221,13 @@ build_wx() {
   [ -f "$inc/wx/msw/init.h" ] || cp "$src/include/wx/msw/init.h" "$inc/wx/msw/"
 }
 
+build_json() {
+  # Header-only: its single-header form is installed as it stands.
+  cp -r "$(srcdir nlohmann-json3)/single_include/nlohmann" "$prefix/include/"
+}
+
 build_zlib
+build_json
 build_expat
 build_sqlite
 build_wx
