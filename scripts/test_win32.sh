@@ -115,13 +115,13 @@ check_run() {
   echo "test_win32: $what: status 255 after $ms ms"
 }
 
-# Whether a server holds its mutex in Wine prefix $1: a second stand-in then
-# leaves at once with status 1; without one it keeps running until stopped.
+# Whether a server holds its mutex in Wine prefix $1. The stand-in's probe
+# only looks, so a server starting at the same moment is not turned away.
 wine_server_running() {
   local status=0
-  WINEPREFIX=$1 timeout 5 wine "$server_dir\\hotfolder.exe" >/dev/null 2>&1 || status=$?
-  [ "$status" -eq 1 ] && return 0
-  [ "$status" -eq 124 ] && return 1
+  WINEPREFIX=$1 timeout 120 wine "$server_dir\\hotfolder.exe" --probe >/dev/null 2>&1 || status=$?
+  [ "$status" -eq 0 ] && return 0
+  [ "$status" -eq 3 ] && return 1
   fail "the stand-in probe ended with status $status"
 }
 
@@ -129,7 +129,7 @@ wine_server_running() {
 start_wine_server() {
   (WINEPREFIX=$1 wine "$server_dir\\hotfolder.exe" >/dev/null 2>&1 &)
   local _
-  for _ in $(seq 20); do
+  for _ in $(seq 60); do
     sleep 0.5
     wine_server_running "$1" && return 0
   done
