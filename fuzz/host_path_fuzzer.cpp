@@ -1,11 +1,11 @@
 // The mapping from Windows paths to host paths, over arbitrary wide text.
 // Every path the tool touches comes from a list file or a folder.cfg; no
 // such text may reach a host file outside the prefix's drives.
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
 #include <string>
-#include <vector>
 
 #include "fuzz/fuzz_support.h"
 #include "platform/platform.h"
@@ -32,30 +32,19 @@ Kind Classify(const std::wstring& text, wchar_t* drive) {
   return path[0] == L'\\' ? Kind::kNowhere : Kind::kRelative;
 }
 
-// The components below `root` in `host`; false when `host` is not below it.
-bool ComponentsBelow(const std::string& host, const std::string& root,
-                     std::vector<std::string>* parts) {
-  if (host.compare(0, root.size(), root) != 0) return false;
-  std::string rest = host.substr(root.size());
-  if (!rest.empty() && rest[0] != '/') return false;
-  for (std::size_t start = 1; start <= rest.size();) {
-    std::size_t end = rest.find('/', start);
-    if (end == std::string::npos) end = rest.size();
-    parts->push_back(rest.substr(start, end - start));
-    start = end + 1;
-  }
-  return true;
-}
-
 // Below its root, a mapped path names every directory it passes through:
 // nothing that climbs, stays put or collapses.
 void CheckStaysBelow(const std::string& host, const std::string& root, std::size_t min_parts) {
-  std::vector<std::string> parts;
-  FUZZ_CHECK(ComponentsBelow(host, root, &parts));
-  FUZZ_CHECK(parts.size() >= min_parts);
-  for (const std::string& part : parts) {
+  FUZZ_CHECK(host.compare(0, root.size(), root) == 0);
+  FUZZ_CHECK(host.size() == root.size() || host[root.size()] == '/');
+  std::size_t parts = 0;
+  for (std::size_t at = root.size(); at < host.size(); ++parts) {
+    const std::size_t end = std::min(host.find('/', at + 1), host.size());
+    const std::string part = host.substr(at + 1, end - at - 1);
     FUZZ_CHECK(!part.empty() && part != "." && part != "..");
+    at = end;
   }
+  FUZZ_CHECK(parts >= min_parts);
 }
 
 // A prefix with drives C: and D:, network shares, and entries that a path
