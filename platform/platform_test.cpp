@@ -212,6 +212,7 @@ TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
       {L"\\\\Server\\Share\\..\\..\\x", "/unc/Server/Share/x"},
       {L"D:\\..\\..\\Jobs", "/d:/Jobs"},
       {L"D:/Jobs/./Brochures/../Brochures/", "/d:/Jobs/Brochures"},
+      {L"D:\\", "/d:"},
       {L"rel\\x.cfg", ""},  // relative, from a directory outside every drive
       {L"", ""},
   };
