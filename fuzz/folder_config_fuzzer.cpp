@@ -56,11 +56,11 @@ const TempPrefix& Prefix() {
 // with a job waiting in it and a spool file beside folder.cfg; no store, or
 // one the store refuses to write into.
 void ResetInstallation(const TempPrefix& prefix, const std::string& config, Situation situation) {
-  std::error_code ec;
-  std::filesystem::remove_all(prefix.root() / kFolderOnD, ec);
-  FUZZ_CHECK(!ec);
-  std::filesystem::remove_all(prefix.root() / kStoreDir, ec);
-  FUZZ_CHECK(!ec);
+  for (const char* dir : {kFolderOnD, kStoreDir}) {
+    std::error_code ec;
+    std::filesystem::remove_all(prefix.root() / dir, ec);
+    FUZZ_CHECK(!ec);
+  }
   WriteLegacyList(prefix, {{kFolder, static_cast<std::uint16_t>(situation.enabled ? 2 : 0)}});
   if (situation.refused) prefix.WriteFile(StoreHostPath(), kDamagedStore);
   std::filesystem::path folder = prefix.root() / kFolderOnD;
@@ -97,10 +97,7 @@ int Depth(const wxXmlNode* root) {
       ++depth;
       continue;
     }
-    while (node && !node->GetNext()) {
-      node = node->GetParent();
-      --depth;
-    }
+    for (; node && !node->GetNext(); --depth) node = node->GetParent();
     if (node) node = node->GetNext();
   }
   return deepest;

@@ -1,11 +1,10 @@
 // What the fuzz targets share: a property check that libFuzzer sees as a
-// crash, a temporary directory in memory, and wide text from arbitrary bytes.
+// crash, and file bytes and wide text from arbitrary input.
 #ifndef HF_FUZZ_FUZZ_SUPPORT_H_
 #define HF_FUZZ_FUZZ_SUPPORT_H_
 
 #include <stdio.h>
 #include <stdlib.h>
-#include <unistd.h>
 
 #include <cstddef>
 #include <cstdint>
@@ -20,14 +19,6 @@
     }                                                                                  \
   } while (0)
 
-// Prefixes are built and removed for every input; in memory that costs no
-// disk writes, and the store's durable commits cost no real syncs. An
-// explicit TMPDIR (scripts/fuzz.sh sets one) wins.
-inline void UseMemoryTempDir() {
-  if (getenv("TMPDIR") != nullptr) return;
-  if (access("/dev/shm", W_OK) == 0) setenv("TMPDIR", "/dev/shm", 1);
-}
-
 // The input as the bytes of a file.
 inline std::string InputBytes(const std::uint8_t* data, std::size_t size) {
   return std::string(reinterpret_cast<const char*>(data), size);
@@ -38,30 +29,21 @@ inline std::string InputBytes(const std::uint8_t* data, std::size_t size) {
 // broken code points reach the code under test too.
 inline std::wstring WideFromBytes(const std::uint8_t* data, std::size_t size) {
   std::wstring text;
-  std::size_t i = 0;
-  while (i < size) {
-    std::uint8_t lead = data[i];
-    int extra = lead < 0x80           ? 0
-                : (lead >> 5) == 0x6  ? 1
-                : (lead >> 4) == 0xE  ? 2
-                : (lead >> 3) == 0x1E ? 3
-                                      : -1;
-    std::uint32_t code = extra == 0   ? lead
-                         : extra == 1 ? lead & 0x1F
-                         : extra == 2 ? lead & 0x0F
-                                      : lead & 0x07;
+  for (std::size_t i = 0; i < size;) {
+    const std::uint8_t lead = data[i];
+    const int extra = lead < 0x80       ? 0
+                      : lead >> 5 == 6  ? 1
+                      : lead >> 4 == 14 ? 2
+                      : lead >> 3 == 30 ? 3
+                                        : -1;
+    std::uint32_t code = lead & (0x7F >> (extra > 0 ? extra + 1 : 0));  // its payload bits
     bool valid = extra >= 0 && i + extra < size;
     for (int k = 1; valid && k <= extra; ++k) {
       valid = (data[i + k] & 0xC0) == 0x80;
       code = (code << 6) | (data[i + k] & 0x3F);
     }
-    if (!valid) {
-      text.push_back(static_cast<wchar_t>(0xDC00 + lead));
-      ++i;
-      continue;
-    }
-    text.push_back(static_cast<wchar_t>(code));
-    i += extra + 1;
+    text.push_back(static_cast<wchar_t>(valid ? code : 0xDC00 + lead));
+    i += valid ? extra + 1 : 1;
   }
   return text;
 }

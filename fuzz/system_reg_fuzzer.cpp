@@ -3,6 +3,7 @@
 // the answers must hang together the way registry keys do.
 #include <cstddef>
 #include <cstdint>
+#include <cwctype>
 #include <string>
 
 #include "fuzz/fuzz_support.h"
@@ -20,20 +21,15 @@ const wchar_t* const kKeys[] = {
     L"Software\\Wine\\Drives",
 };
 
-std::wstring AsciiCase(std::wstring text, bool upper) {
-  for (wchar_t& c : text) {
-    if (upper && c >= L'a' && c <= L'z') c = c - L'a' + L'A';
-    if (!upper && c >= L'A' && c <= L'Z') c = c - L'A' + L'a';
-  }
-  return text;
-}
-
 // A key opens when a section names it or a key below it, ignoring case; so
 // a key that opens has every parent open too, in any letter case.
 void CheckKey(const std::wstring& key) {
   bool opens = platform::HklmKeyOpensForRead(key);
-  FUZZ_CHECK(platform::HklmKeyOpensForRead(AsciiCase(key, true)) == opens);
-  FUZZ_CHECK(platform::HklmKeyOpensForRead(AsciiCase(key, false)) == opens);
+  for (wint_t (*to)(wint_t) : {std::towupper, std::towlower}) {
+    std::wstring cased = key;
+    for (wchar_t& c : cased) c = static_cast<wchar_t>(to(c));
+    FUZZ_CHECK(platform::HklmKeyOpensForRead(cased) == opens);
+  }
   if (!opens) return;
   for (std::size_t cut = key.rfind(L'\\'); cut != std::wstring::npos && cut > 0;
        cut = key.rfind(L'\\', cut - 1)) {

@@ -12,21 +12,6 @@
 
 namespace {
 
-const std::string kPdf2Ps = "{CDD70909-DACE-499B-9186-B6088CD46376}\n";
-const std::string kXrx = "{02AC69D4-CAEE-47E1-912E-95B0C9E8D86A}\n";
-
-// A filter container as the legacy service wrote it: identifier text, a
-// name, the enable text, then the filter's settings section if it has one.
-std::string Container(const std::string& id, const std::string& enable,
-                      const std::string& section = "") {
-  return "<FILTERID>" + id + "<Name>n</Name><Enabled>" + enable + "</Enabled>" + section +
-         "</FILTERID>";
-}
-
-std::string Doc(const std::string& body) {
-  return "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<HotFolder>\n" + body + "\n</HotFolder>\n";
-}
-
 // The map's entries as "key=value;...", in insertion order; empty values
 // left out unless `all`.
 std::string Dump(const SettingsMap& map, bool all = false) {
@@ -39,10 +24,9 @@ std::string Dump(const SettingsMap& map, bool all = false) {
 
 class FolderReaderTest : public ::testing::Test {
  protected:
-  // Lists folder D:\<name> (D:\F<n> when unnamed) with `flag`, writes its
-  // folder.cfg unless null and reads it.
-  bool Read(std::optional<std::string> cfg, const char* flag = "1", std::string name = "") {
-    if (name.empty()) name = "F" + std::to_string(engine_.m_Folders.size());
+  // Lists folder D:\<name> with `flag`, writes its folder.cfg unless null
+  // and reads it.
+  bool Read(std::optional<std::string> cfg, const char* flag, const std::string& name) {
     if (cfg) WriteFolderConfig(prefix_, name, *cfg);
     engine_.m_Folders.Add("D:\\" + name);
     engine_.m_EnabledFlags.Add(flag);
@@ -79,14 +63,18 @@ TEST_F(FolderReaderTest, CasesFromData) {
 
 // Nothing of one folder may reach the next, whatever map it is in.
 TEST_F(FolderReaderTest, FoldersReadInARowAreIsolated) {
+  // Two filters as the legacy service wrote them, and driver settings.
   ASSERT_TRUE(
-      Read(Doc("<FolderSettings><Server>s1</Server></FolderSettings>" + Container(kPdf2Ps, "1") +
-               Container(kXrx, "1") + "<DriverSettings><NumCopies>2</NumCopies></DriverSettings>"),
+      Read("<HotFolder><FolderSettings><Server>s1</Server></FolderSettings>"
+           "<FILTERID>{CDD70909-DACE-499B-9186-B6088CD46376}\n<Enabled>1</Enabled>"
+           "</FILTERID><FILTERID>{02AC69D4-CAEE-47E1-912E-95B0C9E8D86A}\n<Enabled>1"
+           "</Enabled></FILTERID><DriverSettings><NumCopies>2</NumCopies></DriverSettings>"
+           "</HotFolder>",
            "0", "First"));
   EXPECT_FALSE(engine_.m_CurrentEnabled);
   engine_.m_PexFilterConv.GetOrInsert("converted") = "for the first folder";
 
-  ASSERT_TRUE(Read(Doc("<FolderSettings/>"), "2", "Second"));
+  ASSERT_TRUE(Read("<HotFolder><FolderSettings/></HotFolder>", "2", "Second"));
   EXPECT_TRUE(engine_.m_CurrentEnabled);
   EXPECT_EQ(Dump(engine_.m_FolderSettings) + Dump(engine_.m_FilterEnable) +
                 Dump(engine_.m_DriverSettings, true) + Dump(engine_.m_PexFilterConv, true),

@@ -18,9 +18,7 @@ struct LegacyFolder {
 
 // The list file's bytes: the 40-byte header, then one 264-byte record each.
 inline std::string LegacyListBytes(const std::vector<LegacyFolder>& folders) {
-  std::string bytes("KYR ZerOvurova Database", 23);
-  bytes.append(1, '\0');
-  bytes.append(1, '\x01');
+  std::string bytes("KYR ZerOvurova Database\0\x01", 25);  // magic, version 1
   bytes.append(15, '\0');
   for (const LegacyFolder& folder : folders) {
     std::string record(264, '\0');
@@ -55,7 +53,6 @@ inline void WriteFolderConfig(const TempPrefix& prefix, const std::string& folde
 // <d> elements nested `depth` deep around `inside`.
 inline std::string NestedXml(int depth, const std::string& inside = "") {
   std::string xml;
-  xml.reserve(depth * 7u + inside.size());
   for (int i = 0; i < depth; ++i) xml += "<d>";
   xml += inside;
   for (int i = 0; i < depth; ++i) xml += "</d>";

@@ -28,10 +28,9 @@ inline std::string BinDir() {
 // Starts a program with the current environment; answers its pid or -1.
 inline pid_t StartProgram(const std::string& path, const std::vector<std::string>& args = {},
                           const posix_spawn_file_actions_t* actions = nullptr) {
+  std::vector<std::string> copies{path};
+  copies.insert(copies.end(), args.begin(), args.end());
   std::vector<char*> argv;
-  std::string arg0 = path;
-  argv.push_back(arg0.data());
-  std::vector<std::string> copies(args);
   for (std::string& a : copies) argv.push_back(a.data());
   argv.push_back(nullptr);
   pid_t pid = -1;
