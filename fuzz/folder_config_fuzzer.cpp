@@ -69,15 +69,6 @@ void ResetInstallation(const TempPrefix& prefix, const std::string& config, Situ
   prefix.WriteFile(folder / kSettingsDir / "[WorkFolder]" / "job.ps", "%!PS\n");
 }
 
-// What the store received, read back as the inspector reads it.
-std::vector<StoredHotFolder> StoredFolders() {
-  std::vector<StoredHotFolder> folders;
-  if (!std::filesystem::exists(StoreHostPath())) return folders;
-  wxString error;
-  FUZZ_CHECK(ReadStore(StoreHostPath(), &folders, &error));
-  return folders;
-}
-
 bool IsFilterSettingXml(const wxString& text) {
   wxLogNull quiet;
   wxStringInputStream stream(text);
@@ -154,7 +145,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   // Otherwise the folder is registered, as it was listed, with a filter
   // tree that reads back. A disabled folder may still fail after it was
   // created, when it cannot be disabled; it then stays as it is.
-  const std::vector<StoredHotFolder> stored = StoredFolders();
+  std::vector<StoredHotFolder> stored;  // read back as the inspector reads it
+  wxString error;
+  FUZZ_CHECK(!std::filesystem::exists(StoreHostPath()) ||
+             ReadStore(StoreHostPath(), &stored, &error));
   FUZZ_CHECK(stored.size() <= 1);
   if (success) {
     FUZZ_CHECK(stored.size() == 1);

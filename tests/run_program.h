@@ -16,6 +16,7 @@
 #include "platform/platform.h"
 #include "server/server_process.h"
 #include "tests/host_env.h"
+#include "tests/temp_prefix.h"
 
 extern char** environ;
 
@@ -68,13 +69,8 @@ inline RunResult RunProgram(const std::string& path, const std::vector<std::stri
     pid_t pid = StartProgram(path, args, &actions);
     posix_spawn_file_actions_destroy(&actions);
     if (pid > 0) run.status = WaitProgram(pid);
-    std::string* texts[2] = {&run.out, &run.err};
-    for (int i = 0; i < 2; ++i) {
-      rewind(streams[i]);
-      char buffer[4096];
-      for (size_t n; (n = fread(buffer, 1, sizeof buffer, streams[i])) > 0;)
-        texts[i]->append(buffer, n);
-    }
+    run.out = TempPrefix::ReadFile("/proc/self/fd/" + std::to_string(fileno(streams[0])));
+    run.err = TempPrefix::ReadFile("/proc/self/fd/" + std::to_string(fileno(streams[1])));
   }
   for (FILE* stream : streams) {
     if (stream) fclose(stream);
