@@ -131,66 +131,47 @@ std::vector<int> CheckBetweenKills(const Installation& installation) {
   return numbers;
 }
 
-// Picks the moment of the next kill: anywhere from start-up to the end of
-// an even share of the remaining folders, so that the kills are spread over
-// the whole migration.
-struct Schedule {
-  std::mt19937 random{std::random_device{}()};
-  double startup_seconds = 0.1;
-  double per_folder_seconds = 0.005;
-
-  double NextDelay(int remaining, int kills_left) {
-    double share = static_cast<double>(remaining) / (kills_left + 1);
-    return std::uniform_real_distribution<double>(
-        0, startup_seconds + share * per_folder_seconds)(random);
-  }
-  void Learn(double delay, int progress) {
-    if (progress <= 0 || delay <= startup_seconds) return;
-    per_folder_seconds = (per_folder_seconds + (delay - startup_seconds) / progress) / 2;
-  }
-};
-
+// Each run is killed at one of four moments: while it finishes an
+// interrupted run, the moment it has put the settings back; during start-up
+// (the run record is written then); just after a move, before its commit,
+// which leaves a folder interrupted; or anywhere from that move to a few
+// folders later. The folder it is killed at lies a
+// random way into an even share of the folders left, so that the kills are
+// spread over the whole migration.
 TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
   Installation installation;
   RunningServer server;
   const std::string tool = BinDir() + "/hfmigrate";
-  Schedule schedule;
-
+  std::mt19937 random{std::random_device{}()};
   // A run without a list file costs the start-up alone.
   const fs::path list = LegacyListHostPath(installation.prefix);
   fs::rename(list, list.string() + ".away");
-  schedule.startup_seconds = RunProgram(tool).seconds;
+  const double startup_seconds = RunProgram(tool).seconds;
   fs::rename(list.string() + ".away", list);
-
   int kills = 0, recovery_kills = 0, move_kills = 0, most_interrupted = 0;
   std::vector<int> interrupted;
   for (int attempt = 0; kills < kKillsAimedAt && attempt < 4 * kKillsAimedAt; ++attempt) {
-    int before = installation.CountRetired();
-    if (before == kFolders && interrupted.empty()) break;
-    const std::string record = installation.Record();
-    double delay = schedule.NextDelay(kFolders - before, kKillsAimedAt - kills);
-    // Besides kills at random moments, some at the two moments that matter:
-    // just after a move, before its commit (this leaves a folder
-    // interrupted), and while a rerun finishes an interrupted run, the
-    // moment it has put the settings back.
-    const bool in_recovery = !interrupted.empty() && schedule.random() % 2 == 0;
-    const bool after_move = interrupted.empty() && schedule.random() % 4 == 0;
     int next = 0;
     while (next < kFolders && !installation.Has(next, "[_KYR_HotFolder_]")) ++next;
+    if (next == kFolders && interrupted.empty()) break;
+    const std::string record = installation.Record();
+    const bool in_recovery = !interrupted.empty() && random() % 2 == 0;
+    const bool after_move = !in_recovery && random() % 4 == 0;
+    const bool in_startup = !in_recovery && !after_move && random() % 6 == 0;
+    const int share = (kFolders - next) / (kKillsAimedAt - kills + 1);
+    const int target = std::min(kFolders - 1, next + static_cast<int>(random() % (share + 1)));
+    const int watched = in_recovery ? interrupted[0] : target;
     pid_t pid = StartProgram(tool);
     ASSERT_GT(pid, 0);
     const auto start = std::chrono::steady_clock::now();
-    const auto waiting = [&] {
-      return std::chrono::steady_clock::now() - start < std::chrono::seconds(10);
-    };
-    if (in_recovery) {
-      while (!installation.Has(interrupted[0], "[_KYR_HotFolder_]") && waiting()) {
-      }
-    } else if (after_move && next < kFolders) {
-      while (installation.Has(next, "[_KYR_HotFolder_]") && waiting()) {
-      }
-    } else {
-      std::this_thread::sleep_for(std::chrono::duration<double>(delay));
+    while (!in_startup && installation.Has(watched, "[_KYR_HotFolder_]") == !in_recovery &&
+           std::chrono::steady_clock::now() - start < std::chrono::seconds(10)) {
+    }
+    if (in_startup) {
+      std::this_thread::sleep_for(std::chrono::duration<double>(
+          std::uniform_real_distribution<double>(0, startup_seconds)(random)));
+    } else if (!in_recovery && !after_move) {
+      std::this_thread::sleep_for(std::chrono::microseconds(random() % 20000));
     }
     kill(pid, SIGKILL);
     if (WaitProgram(pid) != -1) continue;  // a run that ended first was not killed
@@ -198,7 +179,6 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
     // Killed after putting settings back, before its own record replaced
     // the one it was finishing.
     recovery_kills += in_recovery && installation.Record() == record;
-    if (!in_recovery && !after_move) schedule.Learn(delay, installation.CountRetired() - before);
     interrupted = CheckBetweenKills(installation);
     move_kills += after_move && !interrupted.empty();
     most_interrupted = std::max(most_interrupted, static_cast<int>(interrupted.size()));
