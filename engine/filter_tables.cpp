@@ -190,36 +190,49 @@ ConversionStep LayoutStep(LayoutColumn column) {
   return step;
 }
 
-ConversionStep EpsStep() {
-  return LayoutStep(kEpsColumn);
+const ConversionStep& EpsStep() {
+  static const ConversionStep step = LayoutStep(kEpsColumn);
+  return step;
 }
-ConversionStep JpegStep() {
-  return LayoutStep(kJpegColumn);
+const ConversionStep& JpegStep() {
+  static const ConversionStep step = LayoutStep(kJpegColumn);
+  return step;
 }
-ConversionStep TiffStep() {
-  return LayoutStep(kTiffColumn);
+const ConversionStep& TiffStep() {
+  static const ConversionStep step = LayoutStep(kTiffColumn);
+  return step;
 }
-ConversionStep TiffItStep() {
-  return {AsVector(kTiffItRows), AsVector(kTiffItFixed)};
+const ConversionStep& TiffItStep() {
+  static const ConversionStep step = ConversionStep{AsVector(kTiffItRows), AsVector(kTiffItFixed)};
+  return step;
 }
-ConversionStep OneBitTiffStep() {
-  return {AsVector(kOneBitTiffRows), AsVector(kOneBitTiffFixed)};
+const ConversionStep& OneBitTiffStep() {
+  static const ConversionStep step =
+      ConversionStep{AsVector(kOneBitTiffRows), AsVector(kOneBitTiffFixed)};
+  return step;
 }
-ConversionStep CtlwStep() {
-  return {AsVector(kCtlwRows), AsVector(kCtlwFixed)};
+const ConversionStep& CtlwStep() {
+  static const ConversionStep step = ConversionStep{AsVector(kCtlwRows), AsVector(kCtlwFixed)};
+  return step;
 }
-ConversionStep ExportPsStep() {
-  return {AsVector(kExportPsRows), AsVector(kExportPsFixed)};
+const ConversionStep& ExportPsStep() {
+  static const ConversionStep step =
+      ConversionStep{AsVector(kExportPsRows), AsVector(kExportPsFixed)};
+  return step;
 }
-ConversionStep PexFilterStep() {
-  return {AsVector(kPexFilterRows), AsVector(kPexFilterFixed)};
+const ConversionStep& PexFilterStep() {
+  static const ConversionStep step =
+      ConversionStep{AsVector(kPexFilterRows), AsVector(kPexFilterFixed)};
+  return step;
 }
 
-ConversionStep MsOfficeStep() {
-  return {{}, AsVector(kMsOfficeFixed)};
+const ConversionStep& MsOfficeStep() {
+  static const ConversionStep step = ConversionStep{{}, AsVector(kMsOfficeFixed)};
+  return step;
 }
-ConversionStep DcsStep() {
-  return {{}, AsVector(kDcsFixed)};
+const ConversionStep& DcsStep() {
+  static const ConversionStep step = ConversionStep{{}, AsVector(kDcsFixed)};
+  return step;
 }
 
 const char* ImagePositionText(const wxString& legacy) {

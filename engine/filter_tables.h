@@ -56,18 +56,18 @@ struct ConversionStep {
 enum LayoutColumn { kEpsColumn, kJpegColumn, kTiffColumn, kLayoutColumns };
 
 ConversionStep LayoutStep(LayoutColumn column);
-ConversionStep EpsStep();
-ConversionStep JpegStep();
-ConversionStep TiffStep();
-ConversionStep TiffItStep();
-ConversionStep OneBitTiffStep();
-ConversionStep CtlwStep();
-ConversionStep ExportPsStep();  // EXPORTPS and PDF2GO alike
-ConversionStep PexFilterStep();
+const ConversionStep& EpsStep();
+const ConversionStep& JpegStep();
+const ConversionStep& TiffStep();
+const ConversionStep& TiffItStep();
+const ConversionStep& OneBitTiffStep();
+const ConversionStep& CtlwStep();
+const ConversionStep& ExportPsStep();  // EXPORTPS and PDF2GO alike
+const ConversionStep& PexFilterStep();
 
 // Fixed settings only, written on every folder whatever the legacy maps hold.
-ConversionStep MsOfficeStep();
-ConversionStep DcsStep();
+const ConversionStep& MsOfficeStep();
+const ConversionStep& DcsStep();
 
 // The text of a legacy "IMAGEPOSITION" digit; nullptr for a value that is
 // not a known position, which then writes nothing.

@@ -50,8 +50,8 @@ struct LegacyFilter {
   SettingsMember legacy;               // its settings section; null: none
   SettingsMember converted;            // what its "Filter" element carries
   ConvertWhen convert_when;
-  ConversionStep (*step)();
-  bool pdf_switch;  // "PDFCONVERSION" = "1" turns its output into PDF
+  const ConversionStep& (*step)();  // built once, on first use
+  bool pdf_switch;                  // "PDFCONVERSION" = "1" turns its output into PDF
   const char* identifier;
   const char* display_name;
   DefaultChain default_chain;

@@ -130,14 +130,27 @@ bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attribute
   return setxattr(host.c_str(), kAttributeName, text, static_cast<size_t>(size), 0) == 0;
 }
 
+namespace {
+
+// Renames without ever replacing the target. kUnsupported when the file
+// system cannot refuse by itself, and the caller must reserve the name.
+enum class NoReplace { kDone, kFailed, kUnsupported };
+
+NoReplace RenameNoReplace(const HostPath& source, const HostPath& target) {
+  if (source.empty() || target.empty()) return NoReplace::kFailed;
+  if (renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, target.c_str(), RENAME_NOREPLACE) == 0) {
+    return NoReplace::kDone;
+  }
+  return errno == EINVAL || errno == ENOSYS ? NoReplace::kUnsupported : NoReplace::kFailed;
+}
+
+}  // namespace
+
 bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
   const HostPath source = ToHostPath(from);
   const HostPath target = ToHostPath(to);
-  if (source.empty() || target.empty()) return false;
-  if (renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, target.c_str(), RENAME_NOREPLACE) == 0) {
-    return true;
-  }
-  if (errno != EINVAL && errno != ENOSYS) return false;
+  const NoReplace moved = RenameNoReplace(source, target);
+  if (moved != NoReplace::kUnsupported) return moved == NoReplace::kDone;
   // The file system cannot refuse to replace by itself. Reserving the name
   // with mkdir is atomic, and rename replaces only that empty placeholder.
   struct stat st;
@@ -171,11 +184,8 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
 bool RenameFile(const std::wstring& from, const std::wstring& to) {
   const HostPath source = ToHostPath(from);
   const HostPath target = ToHostPath(to);
-  if (source.empty() || target.empty()) return false;
-  if (renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, target.c_str(), RENAME_NOREPLACE) == 0) {
-    return true;
-  }
-  if (errno != EINVAL && errno != ENOSYS) return false;
+  const NoReplace renamed = RenameNoReplace(source, target);
+  if (renamed != NoReplace::kUnsupported) return renamed == NoReplace::kDone;
   // A second name refuses an existing target by itself; then the first goes.
   return link(source.c_str(), target.c_str()) == 0 && unlink(source.c_str()) == 0;
 }
