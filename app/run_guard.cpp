@@ -6,7 +6,7 @@
 #include "engine/migrator.h"
 #include "convert/settings_dir.h"
 #include "platform/platform.h"
-#include "store/run_record.h"
+#include "engine/run_record.h"
 #include "store/store.h"
 
 namespace {

@@ -5,7 +5,7 @@
 #include <nlohmann/json.hpp>
 
 #include "engine/migrator.h"
-#include "store/run_record.h"
+#include "engine/run_record.h"
 #include "store/store.h"
 #include "store/store_reader.h"
 #include "tests/legacy_fixture.h"

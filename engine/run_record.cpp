@@ -1,4 +1,4 @@
-#include "store/run_record.h"
+#include "engine/run_record.h"
 
 #include <cinttypes>
 #include <cstdio>

@@ -1,4 +1,4 @@
-#include "store/store_json.h"
+#include "inspect/store_json.h"
 
 #include "store/record_fields.h"
 

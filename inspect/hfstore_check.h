@@ -1,7 +1,7 @@
 // hfstore check: each folder of the legacy list against the store and the
 // disk, for a migration tool that prints nothing. It only reads.
-#ifndef HF_STORE_HFSTORE_CHECK_H_
-#define HF_STORE_HFSTORE_CHECK_H_
+#ifndef HF_INSPECT_HFSTORE_CHECK_H_
+#define HF_INSPECT_HFSTORE_CHECK_H_
 
 #include "platform/platform.h"
 
@@ -11,4 +11,4 @@
 // the store cannot be read.
 int RunCheck(const platform::HostPath& store_file, bool json);
 
-#endif  // HF_STORE_HFSTORE_CHECK_H_
+#endif  // HF_INSPECT_HFSTORE_CHECK_H_

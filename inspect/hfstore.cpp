@@ -6,8 +6,8 @@
 #include <clocale>
 #include <iostream>
 
-#include "store/hfstore_check.h"
-#include "store/store_json.h"
+#include "inspect/hfstore_check.h"
+#include "inspect/store_json.h"
 #include "store/store_reader.h"
 
 namespace {

@@ -1,4 +1,4 @@
-#include "store/hfstore_check.h"
+#include "inspect/hfstore_check.h"
 
 #include <filesystem>
 #include <iostream>
@@ -10,7 +10,7 @@
 
 #include "engine/migrator.h"
 #include "convert/settings_dir.h"
-#include "store/run_record.h"
+#include "engine/run_record.h"
 #include "store/store_reader.h"
 
 namespace {

@@ -1,7 +1,7 @@
 // The store as JSON, for `hfstore dump`: one object with "hotFolders", each
 // record under its own name and every member under the record member's name.
-#ifndef HF_STORE_STORE_JSON_H_
-#define HF_STORE_STORE_JSON_H_
+#ifndef HF_INSPECT_STORE_JSON_H_
+#define HF_INSPECT_STORE_JSON_H_
 
 #include <nlohmann/json.hpp>
 
@@ -11,4 +11,4 @@
 
 nlohmann::ordered_json StoreToJson(const std::vector<StoredHotFolder>& folders);
 
-#endif  // HF_STORE_STORE_JSON_H_
+#endif  // HF_INSPECT_STORE_JSON_H_

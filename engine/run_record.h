@@ -8,8 +8,8 @@
 // entry ("R" or "K", the byte length of the folder path, the path in UTF-8)
 // and a line with a checksum of everything before it. A file that does not
 // read exactly so is damaged or not ours, and is never trusted.
-#ifndef HF_STORE_RUN_RECORD_H_
-#define HF_STORE_RUN_RECORD_H_
+#ifndef HF_ENGINE_RUN_RECORD_H_
+#define HF_ENGINE_RUN_RECORD_H_
 
 #include <wx/string.h>
 
@@ -43,4 +43,4 @@ bool RemoveRunRecord();
 // again. False when it could not be moved.
 bool SetAsideRunRecord();
 
-#endif  // HF_STORE_RUN_RECORD_H_
+#endif  // HF_ENGINE_RUN_RECORD_H_
