@@ -94,7 +94,7 @@ bool CHFMigrator::ReadLegacyList() {
   // Opening a FIFO under that name would wait for a writer forever, and an
   // unattended run must end: only a regular file can be the list.
   if (!platform::FileExists(path.ToStdWstring())) return false;
-  std::ifstream in(std::filesystem::path(platform::ToHostPath(path.ToStdWstring())),
+  std::ifstream in(std::filesystem::path(platform::ToLongHostPath(path.ToStdWstring())),
                    std::ios::binary);
   if (!in) return false;
 

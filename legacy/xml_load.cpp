@@ -150,7 +150,7 @@ bool XmlWithinBounds(const std::string& bytes) {
 
 bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc) {
   std::string bytes;
-  if (!ReadBounded(platform::ToHostPath(windows_path.ToStdWstring()), &bytes)) return false;
+  if (!ReadBounded(platform::ToLongHostPath(windows_path.ToStdWstring()), &bytes)) return false;
   if (!PlainlyWithinBounds(bytes) && !XmlWithinBounds(bytes)) return false;
   // The tool prints nothing; wx would log a parse failure of its own.
   wxLogNull quiet;

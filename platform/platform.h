@@ -38,6 +38,18 @@ using HostPath = std::string;
 // that differs only in case.
 HostPath ToHostPath(const std::wstring& windows_path);
 
+// The form of a Windows path that the host's file API takes at any length.
+// On Windows: the full path in extended-length form, "\\?\C:\..." or
+// "\\?\UNC\server\share\...", which the wide file functions accept beyond
+// MAX_PATH and which names the same file the plain path names (the system's
+// own normalisation, "." and ".." and "/" included, is done first); a device
+// path ("\\.\...") or an extended-length one stays as it is, and a path
+// holding a NUL is empty. On POSIX hosts: ToHostPath. Every file service of
+// this layer passes its paths through it, and a file opened above it should
+// be too. ToHostPath keeps the plain form on Windows: the C runtime's stat,
+// under std::filesystem, refuses a name that holds a '?'.
+HostPath ToLongHostPath(const std::wstring& windows_path);
+
 // The reverse: a host path shown as a Windows path, through the drive whose
 // target holds it (longest match). A host path outside every drive keeps its
 // host form.

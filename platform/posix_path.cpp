@@ -226,6 +226,11 @@ HostPath ToHostPath(const std::wstring& windows_path) {
   return mapped.valid ? mapped.Join() : HostPath();
 }
 
+// A POSIX host has no path length limit of the Windows kind.
+HostPath ToLongHostPath(const std::wstring& windows_path) {
+  return ToHostPath(windows_path);
+}
+
 std::wstring FromHostPath(const HostPath& host_path) {
   if (host_path.empty()) return std::wstring();
   const std::string path = posix::CanonicalHostPath(host_path);

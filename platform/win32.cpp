@@ -69,7 +69,8 @@ bool IsSeparator(wchar_t c) {
 }
 
 // Length of the part of a path that names a root and cannot be created:
-// "X:\" or "\\server\share\". Zero for a relative path.
+// "X:\", "\\server\share\" or the extended-length "\\?\X:\". Zero for a relative
+// path.
 std::size_t RootLength(const std::wstring& path) {
   if (path.size() >= 2 && path[1] == L':') {
     return path.size() >= 3 && IsSeparator(path[2]) ? 3 : 2;
@@ -84,12 +85,45 @@ std::size_t RootLength(const std::wstring& path) {
   return IsSeparator(path.empty() ? L'x' : path[0]) ? 1 : 0;
 }
 
+// The system's full-path normalisation, at any length.
+std::wstring FullPath(const std::wstring& path) {
+  std::wstring full(MAX_PATH, L'\0');
+  for (;;) {
+    const DWORD length =
+        GetFullPathNameW(path.c_str(), static_cast<DWORD>(full.size()), &full[0], nullptr);
+    if (length == 0) return std::wstring();
+    if (length < full.size()) {
+      full.resize(length);
+      return full;
+    }
+    full.resize(length);  // the size needed, its terminating NUL included
+  }
+}
+
 }  // namespace
 
 // ---- Paths ------------------------------------------------------------------
 
 HostPath ToHostPath(const std::wstring& windows_path) {
   return windows_path;
+}
+
+// An extended-length path reaches the file system as written, so the full
+// path is made first, by the same normalisation the plain path would get:
+// both forms name the same file.
+HostPath ToLongHostPath(const std::wstring& windows_path) {
+  if (HasNul(windows_path)) return std::wstring();
+  if (windows_path.compare(0, 4, L"\\\\?\\") == 0 || windows_path.compare(0, 4, L"\\\\.\\") == 0) {
+    return windows_path;
+  }
+  if (windows_path.empty()) return windows_path;
+  const std::wstring full = FullPath(windows_path);
+  if (full.size() >= 3 && full[1] == L':' && full[2] == L'\\') return L"\\\\?\\" + full;
+  if (full.compare(0, 2, L"\\\\") == 0 && full.compare(0, 4, L"\\\\.\\") != 0 &&
+      full.compare(0, 4, L"\\\\?\\") != 0) {
+    return L"\\\\?\\UNC\\" + full.substr(2);
+  }
+  return full.empty() ? windows_path : full;  // a device, or nothing the system could complete
 }
 
 std::wstring FromHostPath(const HostPath& host_path) {
@@ -119,31 +153,32 @@ bool RemoveFileSpec(std::wstring* path) {
 // ---- Files ------------------------------------------------------------------
 
 bool FileExists(const std::wstring& windows_path) {
-  DWORD attributes = GetFileAttributesW(windows_path.c_str());
+  DWORD attributes = GetFileAttributesW(ToLongHostPath(windows_path).c_str());
   return attributes != INVALID_FILE_ATTRIBUTES && !(attributes & FILE_ATTRIBUTE_DIRECTORY);
 }
 
 bool DirectoryExists(const std::wstring& windows_path) {
-  DWORD attributes = GetFileAttributesW(windows_path.c_str());
+  DWORD attributes = GetFileAttributesW(ToLongHostPath(windows_path).c_str());
   return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY);
 }
 
 bool CreateDirectories(const std::wstring& windows_path) {
-  if (windows_path.empty()) return false;
-  // Each parent in turn; one that exists already answers an error that the
-  // final test makes irrelevant.
-  for (std::size_t i = RootLength(windows_path); i < windows_path.size(); ++i) {
-    if (IsSeparator(windows_path[i])) CreateDirectoryW(windows_path.substr(0, i).c_str(), nullptr);
+  const std::wstring path = ToLongHostPath(windows_path);
+  if (path.empty()) return false;
+  // Each parent in turn; one that exists already, or a share's root that
+  // cannot be made, answers an error that the final test makes irrelevant.
+  for (std::size_t i = RootLength(path); i < path.size(); ++i) {
+    if (IsSeparator(path[i])) CreateDirectoryW(path.substr(0, i).c_str(), nullptr);
   }
-  CreateDirectoryW(windows_path.c_str(), nullptr);
-  return DirectoryExists(windows_path);
+  CreateDirectoryW(path.c_str(), nullptr);
+  return DirectoryExists(path);
 }
 
 // The bits come back as the OS reports them, those without a kAttribute*
 // name included, so that writing them back after clearing one keeps the rest.
 bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes) {
   if (attributes == nullptr) return false;
-  DWORD bits = GetFileAttributesW(windows_path.c_str());
+  DWORD bits = GetFileAttributesW(ToLongHostPath(windows_path).c_str());
   if (bits == INVALID_FILE_ATTRIBUTES) return false;
   *attributes = bits;
   return true;
@@ -151,12 +186,12 @@ bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attribut
 
 bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes) {
   const DWORD settable = attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_DIRECTORY);
-  return SetFileAttributesW(windows_path.c_str(), settable) != 0;
+  return SetFileAttributesW(ToLongHostPath(windows_path).c_str(), settable) != 0;
 }
 
 bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
   // Without MOVEFILE_REPLACE_EXISTING an existing target makes the move fail.
-  return MoveFileW(from.c_str(), to.c_str()) != 0;
+  return MoveFileW(ToLongHostPath(from).c_str(), ToLongHostPath(to).c_str()) != 0;
 }
 
 // A directory opened for writing can be flushed: NTFS then writes its
@@ -164,7 +199,7 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
 bool SyncDirectory(const std::wstring& windows_path) {
   if (HasNul(windows_path)) return false;
   ScopedHandle directory(
-      FileHandle(CreateFileW(windows_path.c_str(), GENERIC_READ | GENERIC_WRITE,
+      FileHandle(CreateFileW(ToLongHostPath(windows_path).c_str(), GENERIC_READ | GENERIC_WRITE,
                              FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
                              OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
   if (directory.get() == nullptr) return false;
@@ -173,7 +208,8 @@ bool SyncDirectory(const std::wstring& windows_path) {
 
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
   if (HasNul(windows_path)) return false;
-  const std::wstring temporary = windows_path + L".new";
+  const std::wstring target = ToLongHostPath(windows_path);
+  const std::wstring temporary = target + L".new";
   bool written = false;
   {
     ScopedHandle file(FileHandle(CreateFileW(temporary.c_str(), GENERIC_WRITE, 0, nullptr,
@@ -190,7 +226,7 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
     written = written && FlushFileBuffers(file.get()) != 0;
   }
   // Write-through: the call returns once the new name is on the disk.
-  if (!written || !MoveFileExW(temporary.c_str(), windows_path.c_str(),
+  if (!written || !MoveFileExW(temporary.c_str(), target.c_str(),
                                MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)) {
     DeleteFileW(temporary.c_str());
     return false;
@@ -200,12 +236,13 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
 
 bool RenameFile(const std::wstring& from, const std::wstring& to) {
   if (HasNul(from) || HasNul(to)) return false;
-  return MoveFileExW(from.c_str(), to.c_str(), MOVEFILE_WRITE_THROUGH) != 0;
+  return MoveFileExW(ToLongHostPath(from).c_str(), ToLongHostPath(to).c_str(),
+                     MOVEFILE_WRITE_THROUGH) != 0;
 }
 
 bool RemoveFile(const std::wstring& windows_path) {
   if (HasNul(windows_path)) return false;
-  if (DeleteFileW(windows_path.c_str())) return true;
+  if (DeleteFileW(ToLongHostPath(windows_path).c_str())) return true;
   const DWORD error = GetLastError();
   return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
 }

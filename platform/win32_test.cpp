@@ -11,7 +11,15 @@
 
 #include <gtest/gtest.h>
 
+#include <cwchar>
+#include <string>
+#include <utility>
+
 #include "tests/host_env.h"
+
+// windows.h's A/W macros would rename the platform layer's own functions.
+#undef GetFileAttributes
+#undef SetFileAttributes
 
 namespace {
 
@@ -86,6 +94,51 @@ TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
   // Cut at the NUL, the name would be the key, which exists.
   EXPECT_FALSE(platform::HklmKeyOpensForRead(key + std::wstring(1, L'\0') + L"\\Missing"));
   RegDeleteTreeW(HKEY_LOCAL_MACHINE, key.c_str());
+}
+
+// Paths reach the file API in extended-length form, normalised first as the
+// system does for a plain path, so that the two name the same file.
+TEST(Win32, LongPathsNameTheSameFileAtAnyLength) {
+  wchar_t cwd[MAX_PATH] = {};
+  ASSERT_GT(GetCurrentDirectoryW(MAX_PATH, cwd), 0u);
+  const std::wstring here =
+      std::wstring(L"\\\\?\\") + cwd + (cwd[wcslen(cwd) - 1] == L'\\' ? L"" : L"\\");
+  const std::pair<std::wstring, std::wstring> cases[] = {
+      {L"C:\\a\\b", L"\\\\?\\C:\\a\\b"},
+      {L"c:/a/./b/../c", L"\\\\?\\c:\\a\\c"},
+      {L"\\\\server\\share\\x", L"\\\\?\\UNC\\server\\share\\x"},
+      {L"\\\\?\\C:\\as\\..\\is", L"\\\\?\\C:\\as\\..\\is"},
+      {L"\\\\.\\pipe\\x", L"\\\\.\\pipe\\x"},
+      {L"relative", here + L"relative"},
+      {L"", L""},
+      {std::wstring(L"C:\\a\0b", 6), L""},
+  };
+  for (const auto& [path, long_form] : cases) EXPECT_EQ(platform::ToLongHostPath(path), long_form);
+
+  // Every file service on a tree deeper than MAX_PATH.
+  wchar_t temp[MAX_PATH] = {};
+  ASSERT_GT(GetTempPathW(MAX_PATH, temp), 0u);
+  const std::wstring root = std::wstring(temp) + L"hf-long-" + std::to_wstring(GetTickCount64());
+  std::wstring deep = root;
+  while (deep.size() < 300) deep += L"\\" + std::wstring(60, L'd');
+  const std::wstring settings = deep + L"\\[_KYR_HotFolder_]", file = settings + L"\\folder.cfg";
+  ASSERT_TRUE(platform::CreateDirectories(settings));
+  ASSERT_TRUE(platform::ReplaceFileDurably(file, "<x/>"));
+  EXPECT_TRUE(platform::FileExists(file) && platform::DirectoryExists(settings));
+  std::uint32_t bits = 0;
+  EXPECT_TRUE(platform::SetFileAttributes(settings, platform::kAttributeHidden) &&
+              platform::GetFileAttributes(settings, &bits) && (bits & platform::kAttributeHidden));
+  EXPECT_TRUE(platform::SyncDirectory(settings));
+  EXPECT_TRUE(platform::RenameFile(file, file + L".aside") &&
+              platform::RenameFile(file + L".aside", file));
+  const std::wstring retired = deep + L"\\[_KYR_HotFolder_Old]";
+  EXPECT_TRUE(platform::MoveDirectory(settings, retired));
+  EXPECT_TRUE(platform::FileExists(retired + L"\\folder.cfg"));
+  EXPECT_TRUE(platform::RemoveFile(retired + L"\\folder.cfg") &&
+              !platform::FileExists(retired + L"\\folder.cfg"));
+  for (std::wstring dir = retired; dir.size() > root.size(); dir.resize(dir.rfind(L'\\')))
+    RemoveDirectoryW(platform::ToLongHostPath(dir).c_str());
+  RemoveDirectoryW(root.c_str());
 }
 
 }  // namespace
