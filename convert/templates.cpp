@@ -49,12 +49,16 @@ std::size_t DriveLength(const wxString& path) {
   return path.length() >= 2 && path[1] == ':' && wxIsalpha(path[0]) ? 2 : 0;
 }
 
-// Index just past the directory part: the last separator, else the drive.
+// Index just past the directory part: the last run of separators (a run
+// is one separator, as Windows resolves the path), else the drive. The run
+// starts at `last_separator`.
 std::size_t FilePartStart(const wxString& path, std::size_t* last_separator) {
   *last_separator = wxString::npos;
   for (std::size_t i = path.length(); i > 0; --i) {
     if (IsSeparator(path[i - 1])) {
-      *last_separator = i - 1;
+      std::size_t run = i - 1;
+      while (run > 0 && IsSeparator(path[run - 1])) --run;
+      *last_separator = run;
       return i;
     }
   }

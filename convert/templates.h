@@ -14,10 +14,11 @@ bool HasWow6432ProductKey();
 wxString TemplateDirectory();
 
 // Windows path splitting, the way the service split its work folder: the
-// directory part is everything before the last separator ('\' or '/'), with
-// no trailing separator; the file part everything after it (empty when the
-// text ends in a separator; a leading drive such as "D:" is never a file
-// part); a name is a file part without the text from its last dot on.
+// directory part is everything before the last separator ('\' or '/', a
+// run of them counting as one), with no trailing separator; the file part
+// everything after it (empty when the text ends in a separator; a leading
+// drive such as "D:" is never a file part); a name is a file part without
+// the text from its last dot on.
 wxString WindowsDirectoryPart(const wxString& path);
 wxString WindowsFileName(const wxString& path);
 
