@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <tuple>
 
@@ -73,17 +74,21 @@ TEST(ResolveServerName, DispatchAndShortName) {
 // system, or left in place when the retired name is taken; put back with
 // the attributes it had when the store refuses the folder (a damaged store,
 // a path already registered, which stays enabled though listed disabled).
+// The PDF filter's error folder is the running server's directory, its
+// module path cut to 259 characters first as Windows reads it.
 TEST(Registration, RetiringAndRefusal) {
   enum Store { kGood, kDamaged, kRegistered };
   const struct {
     Store store;
     bool taken;
     std::uint32_t before, after;
+    std::string server;  // where a server runs on D:, "" for none
   } cases[] = {
-      {kGood, false, kRo | kSys | kHid | kAttributeArchive, kHid | kAttributeArchive},
-      {kGood, true, kRo | kHid, kHid},
-      {kDamaged, false, kRo | kSys, kRo | kSys},
-      {kRegistered, false, kRo | kHid, kRo | kHid},
+      {kGood, false, kRo | kSys | kHid | kAttributeArchive, kHid | kAttributeArchive, ""},
+      {kGood, true, kRo | kHid, kHid, ""},
+      {kDamaged, false, kRo | kSys, kRo | kSys, ""},
+      {kRegistered, false, kRo | kHid, kRo | kHid, ""},
+      {kGood, false, kRo, 0, std::string(100, 'L') + "/" + std::string(200, 'M')},
   };
   const ResolveCase local = {true, "build7.lab.example", nullptr, L"", nullptr, nullptr};
   g_case = &local;
@@ -97,6 +102,12 @@ TEST(Registration, RetiringAndRefusal) {
     fs::create_directories(settings);
     if (c.taken) fs::create_directory(retired);
     if (c.store == kDamaged) prefix.WriteFile(fs::path(StoreHostPath()), std::string(4096, 'x'));
+    std::optional<RunningServer> server;
+    if (!c.server.empty()) {
+      fs::create_directories(prefix.Drive('d') / c.server);
+      fs::copy(BinDir() + "/hotfolder.exe", prefix.Drive('d') / c.server / "hotfolder.exe");
+      server.emplace((prefix.Drive('d') / c.server / "hotfolder.exe").string());
+    }
     CHFMigrator engine;
     for (int round = c.store == kRegistered ? 0 : 1; round < 2; ++round) {
       ASSERT_TRUE(SetFileAttributes(FromHostPath(settings.string()), c.before));
@@ -122,9 +133,11 @@ TEST(Registration, RetiringAndRefusal) {
     // The address stays as written; the name is the local host's, whole.
     EXPECT_EQ(stored[0].setting.ServerAddr + "|" + stored[0].setting.ServerName,
               "LOCALHOST|build7.lab.example");
-    // No server runs here: the PDF filter's error folder is empty.
-    if (ServerProcesses().empty()) {
-      EXPECT_NE(stored[0].filterConfiguration.Find("<ERRORPATH></ERRORPATH>"), wxNOT_FOUND);
+    // D:\LLL...\MMM...\hotfolder.exe cut within MMM...; no server: empty.
+    if (!c.server.empty() || ServerProcesses().empty()) {
+      const std::string error_path = c.server.empty() ? "" : "D:\\" + c.server.substr(0, 100);
+      EXPECT_NE(stored[0].filterConfiguration.Find("<ERRORPATH>" + error_path + "</ERRORPATH>"),
+                wxNOT_FOUND);
     }
   }
   UseHostResolver(nullptr);

@@ -131,10 +131,16 @@ bool LaunchDetached(const std::wstring& file_name);
 // the host's enumeration order. False when the enumeration fails.
 bool EnumerateProcesses(std::vector<ProcessId>* ids);
 
+// Module names are read as the Windows build reads them, into buffers of the
+// classic path length: a name of more characters is cut to the first
+// kModuleNameLength - 1, on every host alike.
+constexpr std::size_t kModuleNameLength = 260;
+
 // Opens the process (query, read and terminate rights) and reads its first
 // module's base name and, when `file_name` is not null, the module's full
-// file name (shown as a Windows path where a drive holds it). False when the
-// process cannot be opened or its module cannot be queried.
+// file name (shown as a Windows path where a drive holds it), each cut as
+// above. False when the process cannot be opened or its module cannot be
+// queried.
 bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* file_name);
 
 // Ends the process unconditionally with exit code 0.

@@ -128,9 +128,14 @@ bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* fil
       lstat(target.c_str(), &st) != 0) {
     target.resize(target.size() - kDeleted.size());
   }
-  if (base_name != nullptr)
+  if (base_name != nullptr) {
     base_name->assign(posix::Utf8ToWide(target.substr(target.rfind('/') + 1)));
-  if (file_name != nullptr) file_name->assign(FromHostPath(target));
+    base_name->resize(std::min(base_name->size(), kModuleNameLength - 1));
+  }
+  if (file_name != nullptr) {
+    file_name->assign(FromHostPath(target));
+    file_name->resize(std::min(file_name->size(), kModuleNameLength - 1));
+  }
   return true;
 }
 

@@ -35,8 +35,7 @@ constexpr DWORD kMutexAllAccess = 0x1F0001;
 // server the third.
 constexpr DWORD kProcessRights = 0x411;
 
-// Module names are read into buffers of the classic path length.
-constexpr DWORD kNameLength = 260;
+constexpr DWORD kNameLength = kModuleNameLength;
 
 // Closes a handle when the scope ends, so that no early return leaks one.
 class ScopedHandle {
@@ -331,7 +330,9 @@ bool QueryProcessModule(ProcessId id, std::wstring* base_name, std::wstring* fil
     wchar_t path[kNameLength] = {};
     DWORD path_length = K32GetModuleFileNameExW(process.get(), module, path, kNameLength);
     if (path_length == 0) return false;
-    file_name->assign(path, path_length);
+    // A cut name may be reported at the buffer's full size, with or without
+    // its terminating NUL.
+    file_name->assign(path, std::min<DWORD>(path_length, kNameLength - 1));
   }
   base_name->assign(name, length);
   return true;

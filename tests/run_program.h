@@ -87,7 +87,8 @@ inline RunResult RunCaptured(const std::string& path, const std::vector<std::str
 // has no start-up wait.
 class RunningServer {
  public:
-  RunningServer() : pid_(StartProgram(BinDir() + "/hotfolder.exe")) {
+  explicit RunningServer(const std::string& program = BinDir() + "/hotfolder.exe")
+      : pid_(StartProgram(program)) {
     WaitFor([] { return platform::NamedMutexExists(kServerMutex); });
   }
   ~RunningServer() {
