@@ -1,5 +1,6 @@
 #include "inspect/hfstore_check.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <iostream>
 #include <map>
@@ -88,13 +89,18 @@ std::string Utf8(const wxString& text) {
   return std::string(utf8.data(), utf8.length());
 }
 
-// A field of a tab-separated line must not break the line apart.
+// A field of a tab-separated line must not break the line apart, nor be
+// mistaken for another text: one that holds a control character (the list
+// file allows tabs and line feeds in a path) or starts with a double quote
+// is written as the JSON string --json gives it, quotes included.
 std::string Field(const wxString& text) {
-  std::string field = Utf8(text);
-  for (char& c : field) {
-    if (c == '\t' || c == '\n' || c == '\r') c = ' ';
-  }
-  return field;
+  const std::string field = Utf8(text);
+  const bool plain =
+      std::none_of(field.begin(), field.end(), [](unsigned char c) { return c < 0x20; }) &&
+      (field.empty() || field[0] != '"');
+  return plain
+             ? field
+             : nlohmann::json(field).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
 }
 
 void PrintLines(const std::vector<FolderCheck>& checks, const int (&counts)[kResults], bool ok) {

@@ -34,6 +34,11 @@ const Row kRows[] = {
     {"D", true, -1, false, true, false,  // retired by someone else
      "not migrated\tD:\\Jobs\\D\tno folder.cfg at D:\\Jobs\\D\\[_KYR_HotFolder_]\\folder.cfg; "
      "D:\\Jobs\\D\\[_KYR_HotFolder_Old] is left alone: no interrupted run retired it"},
+    // The list allows tabs and line feeds in a path: such a field is written
+    // as its JSON string, so the line keeps its three fields.
+    {"T\tab\nLF", true, -1, false, false, false,
+     "not migrated\t\"D:\\\\Jobs\\\\T\\tab\\nLF\"\t\"no folder.cfg at "
+     "D:\\\\Jobs\\\\T\\tab\\nLF\\\\[_KYR_HotFolder_]\\\\folder.cfg\""},
     {"E", true, -1, true, false, false,
      "not migrated\tD:\\Jobs\\E\tnot registered; its settings are still at "
      "D:\\Jobs\\E\\[_KYR_HotFolder_]\\folder.cfg"},
@@ -45,7 +50,7 @@ const Row kRows[] = {
      "settings not retired\tD:\\Jobs\\H\tregistered, but its settings are still at "
      "D:\\Jobs\\H\\[_KYR_HotFolder_]\\folder.cfg"},
 };
-constexpr int kAsListed = 4;  // the first rows: a run that went well
+constexpr int kAsListed = 5;  // the first rows: a run that went well
 
 std::string Path(const Row& row) {
   return std::string("D:\\Jobs\\") + row.name;
@@ -89,7 +94,7 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
   std::string expected;
   for (const Row& row : kRows) expected += std::string(row.line) + "\n";
   expected +=
-      "8 listed: 2 migrated, 3 not migrated, 1 interrupted, 1 enabled state differs,"
+      "9 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
       " 1 settings not retired; not every folder with legacy settings is migrated as listed\n";
   CapturedRun run = Hfstore({"check"});
   EXPECT_EQ(run.status, 1) << run.err;
@@ -98,9 +103,10 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
   run = Hfstore({"check", "--json"});
   EXPECT_EQ(run.status, 1);
   const nlohmann::json json = nlohmann::json::parse(run.out, nullptr, false);
-  EXPECT_EQ(json["folders"][5]["result"], "interrupted");
-  EXPECT_EQ(json["folders"][6]["storedEnabled"], true);
-  EXPECT_EQ(json["summary"]["not migrated"], 3);
+  EXPECT_EQ(json["folders"][4]["folder"], "D:\\Jobs\\T\tab\nLF");
+  EXPECT_EQ(json["folders"][6]["result"], "interrupted");
+  EXPECT_EQ(json["folders"][7]["storedEnabled"], true);
+  EXPECT_EQ(json["summary"]["not migrated"], 4);
   EXPECT_EQ(json["migratedAsListed"], false);
 
   // Usage errors; a list that cannot be read.
@@ -110,13 +116,20 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
   EXPECT_EQ(Hfstore({"check"}).status, 1);
 }
 
-TEST(Check, RunThatWentWellExitsZero) {
-  TempPrefix prefix;
-  Lay(prefix, kRows, kAsListed);
-  CapturedRun run = Hfstore({"check"});
-  EXPECT_EQ(run.status, 0) << run.out;
-  EXPECT_NE(run.out.find("; every folder with legacy settings is migrated as listed\n"),
-            std::string::npos);
+// A run that went well exits 0; any one folder with legacy settings that is
+// not migrated as listed makes it 1 on its own.
+TEST(Check, ExitStatusOfEachKindAlone) {
+  for (int odd = kAsListed - 1; odd < static_cast<int>(std::size(kRows)); ++odd) {
+    std::vector<Row> rows(kRows, kRows + kAsListed - 1);
+    rows.push_back(kRows[odd]);
+    SCOPED_TRACE(rows.back().line);
+    TempPrefix prefix;
+    Lay(prefix, rows.data(), static_cast<int>(rows.size()));
+    const bool counts = odd >= kAsListed;
+    CapturedRun run = Hfstore({"check"});
+    EXPECT_EQ(run.status, counts ? 1 : 0) << run.out;
+    EXPECT_NE(run.out.find(counts ? "; not every" : "; every"), std::string::npos);
+  }
 }
 
 // D:\Jobs\X was retired by an interrupted run that did not register it, as
