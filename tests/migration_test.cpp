@@ -4,6 +4,7 @@
 // settings directories it names retired byte for byte, nothing else changed,
 // and a second run changing nothing at all.
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -12,6 +13,7 @@
 #include <string>
 #include <vector>
 
+#include "store/schema.h"
 #include "tests/cases.h"
 #include "tests/legacy_fixture.h"
 #include "tests/run_program.h"
@@ -82,16 +84,41 @@ json Dump() {
   return json::parse(text, nullptr, false);
 }
 
+// Runs SQL on the store (made if missing); answers the first column of the
+// last row as a number, -1 for none.
+int StoreSql(const TempPrefix& prefix, const std::string& sql) {
+  const fs::path file = prefix.root() / kStoreDir / "HotFolders.db";
+  fs::create_directories(file.parent_path());
+  sqlite3* db = nullptr;
+  int number = -1;
+  const auto first = [](void* n, int, char** v, char**) {
+    return *static_cast<int*>(n) = std::stoi(v[0]), 0;
+  };
+  if (sqlite3_open(file.c_str(), &db) == SQLITE_OK)
+    sqlite3_exec(db, sql.c_str(), first, &number, nullptr);
+  sqlite3_close(db);
+  return number;
+}
+
+// The store, made ahead of the run, logs every change of a folder's enabled
+// state: a folder listed disabled is created disabled in its one commit.
+const std::string kLogEnabledChanges =
+    db::CreateSchemaSql() +
+    "CREATE TABLE enabled_log(path); CREATE TRIGGER log AFTER UPDATE OF enabled ON hot_folder "
+    "BEGIN INSERT INTO enabled_log VALUES(new.FolderPath); END;";
+
 TEST(Migration, InstallationEndToEnd) {
   TempPrefix prefix;
   RunningServer server;  // before the picture: it keeps its mutex in the prefix
   const Tree expected = Install(prefix);
+  StoreSql(prefix, kLogEnabledChanges);
   const json golden = json::parse(TempPrefix::ReadFile(kData + "dump.json"), nullptr, false);
   for (int run = 0; run < 2; ++run) {
     SCOPED_TRACE(run);
     EXPECT_EQ(RunProgram("timeout", {"60", BinDir() + "/hfmigrate"}).status, 255);
     EXPECT_EQ(json::diff(golden, Dump()).dump(1), "[]");
     EXPECT_EQ(Differences(Snapshot(prefix.root()), expected), "");
+    EXPECT_EQ(StoreSql(prefix, "SELECT count(*) FROM enabled_log"), 0);
   }
 }
 
