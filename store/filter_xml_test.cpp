@@ -27,58 +27,59 @@ bool SavedByWx(const wxXmlNode& root, std::string* text) {
   return true;
 }
 
-wxXmlNode* Element(const wxString& name, wxXmlNode* parent = nullptr) {
-  auto* node = new wxXmlNode(wxXML_ELEMENT_NODE, name);
-  if (parent) parent->AddChild(node);
-  return node;
+// The tree of a document's text.
+wxXmlNode* Parsed(const std::string& text) {
+  wxStringInputStream in(wxString::FromUTF8(text));
+  wxXmlDocument document(in);
+  return document.IsOk() ? document.DetachRoot() : nullptr;
 }
 
-void Text(wxXmlNode* parent, const wxString& text, wxXmlNodeType type = wxXML_TEXT_NODE) {
-  parent->AddChild(new wxXmlNode(type, wxString(), text));
+// A filter tree as registration builds it, in the text "<key>", "<value>"
+// and "<id>" are put into: FilterSetting / Filter name= / UI with one element
+// per setting.
+std::string FilterTree(const std::string& key, const std::string& value, const std::string& id) {
+  return "<FilterSetting><Filter name=\"" + id + "\"><UI><" + key + ">" + value + "</" + key +
+         "><RESOLUTION>600</RESOLUTION></UI></Filter><Filter name=\"KYR.VDP.1\"><UI/></Filter>"
+         "</FilterSetting>";
 }
 
-// A filter tree as registration builds it: FilterSetting / Filter name= / UI
-// with one element per setting.
-wxXmlNode* FilterTree(const char* key, const wxString& value, const char* identifier) {
-  wxXmlNode* root = Element("FilterSetting");
-  wxXmlNode* filter = Element("Filter", root);
-  filter->AddAttribute("name", wxString::FromUTF8(identifier));
-  wxXmlNode* ui = Element("UI", filter);
-  Text(Element(key, ui), value);
-  Text(Element("RESOLUTION", ui), "600");
-  Element("UI", Element("Filter", root))->GetParent()->AddAttribute("name", "KYR.VDP.1");
-  return root;
+// The first setting's element of such a tree.
+wxXmlNode* Setting(const wxXmlNode& tree) {
+  return tree.GetChildren()->GetChildren()->GetChildren();
 }
 
 TEST(FilterXml, WritesWhatTheXmlLibraryWrites) {
   wxInitializer init;
   const char* settings[][3] = {
       {"ERRORPATH", "C:\\Server", "KYR.PDF.1"},
-      {"FILENAMESTRUCTURE", "<a> & \"b\" 'c' %J_%C.tif", "KYR.1BIT.1"},
-      {"V", "  two\tlines\nand\r\na return  ", "KYR.PS.1"},
-      {"V", "x", "a<b>&\"c\"\t\n\r'd'"},  // markup and white space in an attribute
+      {"FILENAMESTRUCTURE", "&lt;a&gt; &amp; \"b\" 'c' %J_%C.tif", "KYR.1BIT.1"},
+      {"V", "  two&#9;lines&#10;and&#13;&#10;a return  ", "KYR.PS.1"},
+      {"V", "x", "a&lt;b>&amp;&quot;c&quot;&#9;&#10;&#13;'d'"},  // markup, white space
       {"MENU", "Caf\xC3\xA9 \xE2\x82\xAC \xF0\x9F\x98\x80", "KYR.PDF.1"},
-      {"SELECTEDDISTILLERPROFILE", "", "KYR.PS.1"},
   };
   std::vector<std::pair<std::unique_ptr<wxXmlNode>, bool>> trees;  // and whether writable
-  for (auto& [key, value, identifier] : settings) {
-    trees.emplace_back(FilterTree(key, wxString::FromUTF8(value), identifier), true);
-  }
-  trees.emplace_back(Element("FilterSetting"), true);
-  wxXmlNode* kinds = Element("FilterSetting");
-  Text(kinds, "raw <cdata> & text", wxXML_CDATA_SECTION_NODE);
-  Text(kinds, " a note ", wxXML_COMMENT_NODE);
-  kinds->AddChild(new wxXmlNode(wxXML_PI_NODE, "target", "data"));
+  for (auto& [key, value, id] : settings)
+    trees.emplace_back(Parsed(FilterTree(key, value, id)), true);
+  trees.emplace_back(Parsed("<FilterSetting/>"), true);
+  trees.emplace_back(Parsed("<FilterSetting><![CDATA[raw <cdata> & text]]><!-- a note -->"
+                            "<?target data?></FilterSetting>"),
+                     true);
+  // What no document gives: an empty text, text written as is, a lone
+  // surrogate (which has no UTF-8 form).
+  trees.emplace_back(Parsed(FilterTree("SELECTEDDISTILLERPROFILE", "", "KYR.PS.1")), true);
+  Setting(*trees.back().first)->AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(), wxString()));
   auto* verbatim = new wxXmlNode(wxXML_TEXT_NODE, wxString(), "<kept as is>");
   verbatim->SetNoConversion(true);
-  kinds->AddChild(verbatim);
-  trees.emplace_back(kinds, true);
-  trees.emplace_back(FilterTree("V", wxString(1, static_cast<wchar_t>(0xD800)), "KYR.PDF.1"),
-                     false);  // a lone surrogate has no UTF-8 form
+  trees.back().first->AddChild(verbatim);
+  trees.emplace_back(Parsed(FilterTree("V", "", "KYR.PDF.1")), false);
+  Setting(*trees.back().first)
+      ->AddChild(
+          new wxXmlNode(wxXML_TEXT_NODE, wxString(), wxString(1, static_cast<wchar_t>(0xD800))));
 
   for (std::size_t i = 0; i < trees.size(); ++i) {
     SCOPED_TRACE(i);
     const auto& [tree, writable] = trees[i];
+    ASSERT_TRUE(tree);
     std::string expected, written = "stale";
     EXPECT_EQ(SavedByWx(*tree, &expected), writable);
     EXPECT_EQ(db::FilterXmlText(*tree, &written), writable);
