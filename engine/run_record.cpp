@@ -2,10 +2,6 @@
 
 #include <cinttypes>
 #include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <sstream>
 
 #include "platform/platform.h"
 #include "store/store_reader.h"
@@ -114,40 +110,50 @@ bool DecodeRunRecord(const std::string& bytes, std::vector<RunRecordEntry>* entr
   return true;
 }
 
+// The record's folder is the store's: reached through no link but those of
+// an administrator, SYSTEM or the running user, or the record is not
+// touched at all. Behind someone else's link there is no record of ours.
+namespace {
+bool RecordFolderTrusted(bool create) {
+  return platform::OpenTrustedFolder(StoreFolder(), create).trust ==
+         platform::FolderTrust::kTrusted;
+}
+}  // namespace
+
 RunRecordState ReadRunRecord(std::vector<RunRecordEntry>* entries) {
   entries->clear();
   const std::wstring path = RunRecordPath();
-  if (path.empty()) return RunRecordState::kNone;
-  if (!platform::FileExists(path)) {
-    // Something else under the name (a directory) is no record either.
-    return platform::DirectoryExists(path) ? RunRecordState::kDamaged : RunRecordState::kNone;
-  }
-  std::ifstream in(std::filesystem::path(platform::ToHostPath(path)), std::ios::binary);
+  if (path.empty() || !RecordFolderTrusted(/*create=*/false)) return RunRecordState::kNone;
+  // A link, a directory or anything else under the name is no record either.
   std::string bytes;
-  char buffer[1 << 16];
-  while (in.read(buffer, sizeof buffer) || in.gcount() > 0) {
-    bytes.append(buffer, static_cast<std::size_t>(in.gcount()));
-    if (bytes.size() > kMaxRecordBytes) return RunRecordState::kDamaged;
+  switch (platform::ReadRegularFile(path, kMaxRecordBytes, &bytes)) {
+    case platform::FileRead::kMissing:
+      return RunRecordState::kNone;
+    case platform::FileRead::kRead:
+      return DecodeRunRecord(bytes, entries) ? RunRecordState::kFound : RunRecordState::kDamaged;
+    case platform::FileRead::kNotAFile:
+    case platform::FileRead::kFailed:
+      break;
   }
-  if (!in.eof()) return RunRecordState::kDamaged;
-  return DecodeRunRecord(bytes, entries) ? RunRecordState::kFound : RunRecordState::kDamaged;
+  return RunRecordState::kDamaged;
 }
 
 bool WriteRunRecord(const std::vector<RunRecordEntry>& entries) {
-  const std::wstring folder = StoreFolder();
-  if (RunRecordPath().empty()) return false;
-  if (!platform::DirectoryExists(folder) && !platform::CreateDirectories(folder)) return false;
+  if (RunRecordPath().empty() || !RecordFolderTrusted(/*create=*/true)) return false;
   return platform::ReplaceFileDurably(RunRecordPath(), EncodeRunRecord(entries));
 }
 
 bool RemoveRunRecord() {
   const std::wstring path = RunRecordPath();
-  return path.empty() || platform::RemoveFile(path);
+  if (path.empty()) return true;
+  const platform::FolderTrust trust = platform::OpenTrustedFolder(StoreFolder(), false).trust;
+  return trust == platform::FolderTrust::kMissing ||
+         (trust == platform::FolderTrust::kTrusted && platform::RemoveFile(path));
 }
 
 bool SetAsideRunRecord() {
   const std::wstring path = RunRecordPath();
-  if (path.empty()) return false;
+  if (path.empty() || !RecordFolderTrusted(/*create=*/false)) return false;
   for (int n = 1; n <= 100; ++n) {
     std::wstring aside = path + kDamagedSuffix;
     if (n > 1) aside += L"-" + std::to_wstring(n);

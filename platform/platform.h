@@ -11,6 +11,7 @@
 #ifndef HF_PLATFORM_PLATFORM_H_
 #define HF_PLATFORM_PLATFORM_H_
 
+#include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -95,9 +96,11 @@ bool MoveDirectory(const std::wstring& from, const std::wstring& to);
 // survives a power loss once this answers true.
 bool SyncDirectory(const std::wstring& windows_path);
 
-// Writes a file anew, durably: the bytes go to a file beside it, are flushed,
-// and that file is renamed over the old one, so a reader or a crash finds
-// the old file or the new one whole, never a part of either.
+// Writes a file anew, durably: the bytes go to a file beside it ("<name>.new",
+// created new, never through a link; a stale entry of that name is removed
+// first), are flushed, and that file is renamed over the old one, so a reader
+// or a crash finds the old file or the new one whole, never a part of either.
+// A link under the file's own name is replaced, never followed.
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes);
 
 // Renames a regular file. Fails, changing nothing, when the target exists.
@@ -105,6 +108,49 @@ bool RenameFile(const std::wstring& from, const std::wstring& to);
 
 // Removes a regular file. True when none is left under that name.
 bool RemoveFile(const std::wstring& windows_path);
+
+// Reads a whole regular file of at most `max_bytes`, never through a link:
+// a link, a directory or anything else under the name is kNotAFile.
+enum class FileRead { kRead, kMissing, kNotAFile, kFailed };
+FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
+                         std::string* bytes);
+
+// ---- Folders of an elevated program -----------------------------------------
+//
+// The tool may run elevated and keeps its files below the all-users folder,
+// where ordinary users may be able to create entries. It writes nothing
+// through a link it did not make: a link on the way to its folder is
+// followed only when an administrator, SYSTEM or the running user owns it
+// (on POSIX hosts: root or the running user).
+
+enum class FolderTrust {
+  kTrusted,        // a directory, reached through no link but trusted ones
+  kMissing,        // it, or a directory on the way, does not exist
+  kForeignLink,    // a link on the way is owned by someone else
+  kNotADirectory,  // something other than a directory stands on the way
+  kFailed,         // the file system did not answer
+};
+
+struct TrustedFolder {
+  FolderTrust trust = FolderTrust::kFailed;
+  // kTrusted: the directory as the host names it, on POSIX hosts with every
+  // link resolved, so that files below it can be opened refusing any link.
+  // Otherwise the entry that was refused or missing.
+  HostPath path;
+};
+
+// Walks the directory named by a Windows path and every directory on the
+// way to it. With `create`, missing directories below the drive are made,
+// writable by administrators (POSIX: the owner) and readable by everyone,
+// with nothing inherited from the folder above.
+TrustedFolder OpenTrustedFolder(const std::wstring& windows_path, bool create);
+
+// The same walk, creating nothing, for a directory named by a host path.
+TrustedFolder CheckTrustedHostFolder(const HostPath& host_path);
+
+// True when the entry is a link (a symbolic link, a junction or another
+// reparse point), looked at without following it.
+bool IsLink(const HostPath& host_path);
 
 // ---- Named mutex ----------------------------------------------------------
 

@@ -169,16 +169,59 @@ bool SyncDirectory(const std::wstring& windows_path) {
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
   const HostPath host = ToHostPath(windows_path);
   if (host.empty()) return false;
+  // Whatever is under the temporary name goes first; unlink removes a link
+  // itself. The file is then made new (O_EXCL fails on any entry, a link
+  // included), so no byte is written through someone else's link.
   const std::string temporary = host + ".new";
-  const int fd = open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+  if (unlink(temporary.c_str()) != 0 && errno != ENOENT) return false;
+  const int fd =
+      open(temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0644);
   if (fd < 0) return false;
   bool written = WriteAll(fd, bytes) && fsync(fd) == 0;
   written = close(fd) == 0 && written;
+  // rename replaces an entry under the final name, a link included, without
+  // following it.
   if (!written || rename(temporary.c_str(), host.c_str()) != 0) {
     unlink(temporary.c_str());
     return false;
   }
   return SyncHostDirectory(HostParent(host));
+}
+
+FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
+                         std::string* bytes) {
+  bytes->clear();
+  const HostPath host = ToHostPath(windows_path);
+  if (host.empty()) return FileRead::kMissing;
+  // O_NONBLOCK: a FIFO under the name must not hold the read up.
+  const int fd = open(host.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+  if (fd < 0) {
+    if (errno == ENOENT) return FileRead::kMissing;
+    return errno == ELOOP ? FileRead::kNotAFile : FileRead::kFailed;
+  }
+  struct stat st;
+  FileRead result = fstat(fd, &st) != 0   ? FileRead::kFailed
+                    : S_ISREG(st.st_mode) ? FileRead::kRead
+                                          : FileRead::kNotAFile;
+  char buffer[1 << 16];
+  while (result == FileRead::kRead) {
+    const ssize_t n = read(fd, buffer, sizeof buffer);
+    if (n < 0 && errno == EINTR) continue;
+    if (n == 0) break;
+    if (n < 0 || bytes->size() + static_cast<std::size_t>(n) > max_bytes) {
+      result = FileRead::kFailed;
+    } else {
+      bytes->append(buffer, static_cast<std::size_t>(n));
+    }
+  }
+  close(fd);
+  if (result != FileRead::kRead) bytes->clear();
+  return result;
+}
+
+bool IsLink(const HostPath& host_path) {
+  struct stat st;
+  return !host_path.empty() && lstat(host_path.c_str(), &st) == 0 && S_ISLNK(st.st_mode);
 }
 
 bool RenameFile(const std::wstring& from, const std::wstring& to) {

@@ -9,8 +9,10 @@
 
 #include <windows.h>
 
+#include <aclapi.h>
 #include <knownfolders.h>
 #include <psapi.h>
+#include <sddl.h>
 #include <shlobj.h>
 #include <shlwapi.h>
 
@@ -207,12 +209,18 @@ bool SyncDirectory(const std::wstring& windows_path) {
 
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
   if (HasNul(windows_path)) return false;
+  // A stale entry under the temporary name goes first (DeleteFileW removes a
+  // link itself). CREATE_NEW fails on any entry left, and with
+  // FILE_FLAG_OPEN_REPARSE_POINT a link there counts as that entry instead
+  // of being followed: no byte goes through someone else's link.
   const std::wstring target = ToLongHostPath(windows_path);
   const std::wstring temporary = target + L".new";
+  DeleteFileW(temporary.c_str());
   bool written = false;
   {
-    ScopedHandle file(FileHandle(CreateFileW(temporary.c_str(), GENERIC_WRITE, 0, nullptr,
-                                             CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr)));
+    ScopedHandle file(
+        FileHandle(CreateFileW(temporary.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
+                               FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr)));
     if (file.get() == nullptr) return false;
     std::size_t done = 0;
     written = true;
@@ -224,13 +232,57 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
     }
     written = written && FlushFileBuffers(file.get()) != 0;
   }
-  // Write-through: the call returns once the new name is on the disk.
+  // Write-through: the call returns once the new name is on the disk. A
+  // link under the final name is replaced as an entry, not followed.
   if (!written || !MoveFileExW(temporary.c_str(), target.c_str(),
                                MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)) {
     DeleteFileW(temporary.c_str());
     return false;
   }
   return true;
+}
+
+FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
+                         std::string* bytes) {
+  bytes->clear();
+  const std::wstring path = ToLongHostPath(windows_path);
+  if (path.empty()) return FileRead::kMissing;
+  // Opened as itself if it is a link; without backup semantics a directory
+  // does not open at all.
+  ScopedHandle file(FileHandle(CreateFileW(
+      path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+      OPEN_EXISTING, FILE_FLAG_OPEN_REPARSE_POINT, nullptr)));
+  if (file.get() == nullptr) {
+    const DWORD error = GetLastError();
+    if (error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND) return FileRead::kMissing;
+    const DWORD attributes = GetFileAttributesW(path.c_str());
+    return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY)
+               ? FileRead::kNotAFile
+               : FileRead::kFailed;
+  }
+  BY_HANDLE_FILE_INFORMATION info;
+  if (!GetFileInformationByHandle(file.get(), &info)) return FileRead::kFailed;
+  if (GetFileType(file.get()) != FILE_TYPE_DISK ||
+      (info.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0) {
+    return FileRead::kNotAFile;
+  }
+  char buffer[1 << 16];
+  for (;;) {
+    DWORD n = 0;
+    if (!ReadFile(file.get(), buffer, sizeof buffer, &n, nullptr) ||
+        bytes->size() + n > max_bytes) {
+      bytes->clear();
+      return FileRead::kFailed;
+    }
+    if (n == 0) return FileRead::kRead;
+    bytes->append(buffer, n);
+  }
+}
+
+bool IsLink(const HostPath& host_path) {
+  if (host_path.empty() || HasNul(host_path)) return false;
+  const DWORD attributes = GetFileAttributesW(ToLongHostPath(host_path).c_str());
+  return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_REPARSE_POINT);
 }
 
 bool RenameFile(const std::wstring& from, const std::wstring& to) {
@@ -244,6 +296,111 @@ bool RemoveFile(const std::wstring& windows_path) {
   if (DeleteFileW(ToLongHostPath(windows_path).c_str())) return true;
   const DWORD error = GetLastError();
   return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
+}
+
+// ---- Folders of an elevated program -------------------------------------------
+
+namespace {
+
+// Administrators and SYSTEM: full control; Users: read and traverse. "P"
+// keeps out what the folder above would pass on (under C:\ProgramData, the
+// right of every user to create entries); the entries are inherited by
+// everything made inside, the store's files and the run record included.
+constexpr wchar_t kOwnFolderAccess[] = L"D:P(A;OICI;FA;;;BA)(A;OICI;FA;;;SY)(A;OICI;0x1200a9;;;BU)";
+
+// The running user's SID, read from the process token.
+std::vector<unsigned char> CurrentUserSid() {
+  HANDLE raw = nullptr;
+  if (!OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, &raw)) return {};
+  ScopedHandle token(raw);
+  DWORD size = 0;
+  GetTokenInformation(token.get(), TokenUser, nullptr, 0, &size);
+  std::vector<unsigned char> buffer(size);
+  if (size == 0 || !GetTokenInformation(token.get(), TokenUser, buffer.data(), size, &size)) {
+    return {};
+  }
+  const PSID sid = reinterpret_cast<TOKEN_USER*>(buffer.data())->User.Sid;
+  const unsigned char* begin = static_cast<const unsigned char*>(sid);
+  return std::vector<unsigned char>(begin, begin + GetLengthSid(sid));
+}
+
+// Whether an administrator, SYSTEM or the running user owns the entry
+// itself: a link is opened as the link, not as what it names.
+bool OwnerTrusted(const std::wstring& path, const std::vector<unsigned char>& user) {
+  ScopedHandle entry(FileHandle(CreateFileW(
+      path.c_str(), READ_CONTROL, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+      OPEN_EXISTING, FILE_FLAG_OPEN_REPARSE_POINT | FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
+  if (entry.get() == nullptr) return false;
+  PSID owner = nullptr;
+  PSECURITY_DESCRIPTOR descriptor = nullptr;
+  if (GetSecurityInfo(entry.get(), SE_FILE_OBJECT, OWNER_SECURITY_INFORMATION, &owner, nullptr,
+                      nullptr, nullptr, &descriptor) != ERROR_SUCCESS) {
+    return false;
+  }
+  const bool trusted =
+      owner != nullptr && IsValidSid(owner) &&
+      (IsWellKnownSid(owner, WinBuiltinAdministratorsSid) ||
+       IsWellKnownSid(owner, WinLocalSystemSid) ||
+       (!user.empty() && EqualSid(owner, const_cast<unsigned char*>(user.data()))));
+  LocalFree(descriptor);
+  return trusted;
+}
+
+bool CreateOwnDirectory(const std::wstring& path) {
+  PSECURITY_DESCRIPTOR descriptor = nullptr;
+  if (!ConvertStringSecurityDescriptorToSecurityDescriptorW(kOwnFolderAccess, SDDL_REVISION_1,
+                                                            &descriptor, nullptr)) {
+    return false;
+  }
+  SECURITY_ATTRIBUTES attributes = {sizeof(attributes), descriptor, FALSE};
+  const bool created = CreateDirectoryW(path.c_str(), &attributes) != 0;
+  LocalFree(descriptor);
+  return created;
+}
+
+// Each directory from below the drive or share to the end of `path`, in
+// turn; the drive or share itself is never made.
+TrustedFolder Walk(const std::wstring& path, bool create) {
+  const std::size_t root = RootLength(path);
+  if (path.empty() || HasNul(path) || root == 0) return {FolderTrust::kFailed, path};
+  const std::vector<unsigned char> user = CurrentUserSid();
+  for (std::size_t end = root; end <= path.size(); ++end) {
+    if (end < path.size() && !IsSeparator(path[end])) continue;
+    if (end == root || IsSeparator(path[end - 1])) continue;  // no component ends here
+    const std::wstring part = path.substr(0, end);
+    const std::wstring long_part = ToLongHostPath(part);
+    DWORD attributes = GetFileAttributesW(long_part.c_str());
+    if (attributes == INVALID_FILE_ATTRIBUTES) {
+      const DWORD error = GetLastError();
+      if (error != ERROR_FILE_NOT_FOUND && error != ERROR_PATH_NOT_FOUND) {
+        return {FolderTrust::kFailed, part};
+      }
+      if (!create) return {FolderTrust::kMissing, part};
+      // Someone making it first is looked at like any existing entry.
+      CreateOwnDirectory(long_part);
+      attributes = GetFileAttributesW(long_part.c_str());
+      if (attributes == INVALID_FILE_ATTRIBUTES) return {FolderTrust::kFailed, part};
+    }
+    if (attributes & FILE_ATTRIBUTE_REPARSE_POINT) {
+      if (!OwnerTrusted(long_part, user)) return {FolderTrust::kForeignLink, part};
+    } else if (!(attributes & FILE_ATTRIBUTE_DIRECTORY)) {
+      return {FolderTrust::kNotADirectory, part};
+    }
+  }
+  return {FolderTrust::kTrusted, path};
+}
+
+}  // namespace
+
+TrustedFolder OpenTrustedFolder(const std::wstring& windows_path, bool create) {
+  return Walk(windows_path, create);
+}
+
+TrustedFolder CheckTrustedHostFolder(const HostPath& host_path) {
+  // A relative path counts from the current directory.
+  const std::wstring full = HasNul(host_path) ? std::wstring() : FullPath(host_path);
+  if (full.empty()) return {FolderTrust::kFailed, host_path};
+  return Walk(full, /*create=*/false);
 }
 
 // ---- Named mutex ------------------------------------------------------------

@@ -8,6 +8,7 @@
 #include "store/record_fields.h"
 #include "store/schema.h"
 #include "store/sqlite_statement.h"
+#include "store/store_file.h"
 
 std::wstring StoreFolder() {
   return platform::CommonAppDataFolder() + L"\\KYR\\Dirorodiv";
@@ -211,12 +212,21 @@ std::string ImmutableUri(const std::filesystem::path& file) {
 bool ReadStore(const platform::HostPath& file, std::vector<StoredHotFolder>* folders,
                wxString* error) {
   folders->clear();
-  std::filesystem::path path(file);
-  wxString shown = wxString::FromUTF8(path.u8string());
+  wxString shown = wxString::FromUTF8(std::filesystem::path(file).u8string());
+  // Read through the same rules as the writer's, since even a reader may
+  // create SQLite's companion files: no link of someone else's on the way,
+  // none at the store's files, and SQLite told to follow none.
+  const db::StoreFile placed = db::CheckStoreFile(file);
+  if (placed.path.empty()) {
+    *error = placed.missing ? "no store at " + shown
+                            : "refusing store " + shown + ": " + wxString::FromUTF8(placed.refusal);
+    return false;
+  }
+  const std::filesystem::path path(placed.path);
   std::error_code ec;
   // Checked first: SQLite would create a missing file on some paths, and a
   // reader must never leave a database behind.
-  if (!std::filesystem::is_regular_file(path, ec)) {
+  if (!std::filesystem::is_regular_file(std::filesystem::symlink_status(path, ec))) {
     *error = "no store at " + shown;
     return false;
   }
@@ -228,10 +238,12 @@ bool ReadStore(const platform::HostPath& file, std::vector<StoredHotFolder>* fol
   // the ordinary way.
   Stamp before = StampOf(path);
   if (!before.has_wal &&
-      ReadDatabase(ImmutableUri(path), SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, shown, folders,
+      ReadDatabase(ImmutableUri(path),
+                   SQLITE_OPEN_READONLY | SQLITE_OPEN_URI | SQLITE_OPEN_NOFOLLOW, shown, folders,
                    error) &&
       StampOf(path) == before) {
     return true;
   }
-  return ReadDatabase(path.u8string(), SQLITE_OPEN_READONLY, shown, folders, error);
+  return ReadDatabase(path.u8string(), SQLITE_OPEN_READONLY | SQLITE_OPEN_NOFOLLOW, shown, folders,
+                      error);
 }

@@ -11,6 +11,7 @@
 #include "store/filter_xml.h"
 #include "store/record_fields.h"
 #include "store/schema.h"
+#include "store/store_file.h"
 
 namespace db {
 
@@ -26,7 +27,7 @@ enum class FileState { kMissing, kEmpty, kSqlite, kUnusable };
 // refused before anything could write to it.
 FileState Classify(const std::filesystem::path& file) {
   std::error_code ec;
-  std::filesystem::file_status status = std::filesystem::status(file, ec);
+  std::filesystem::file_status status = std::filesystem::symlink_status(file, ec);
   if (status.type() == std::filesystem::file_type::not_found) return FileState::kMissing;
   if (ec || !std::filesystem::is_regular_file(status)) return FileState::kUnusable;
   std::ifstream in(file, std::ios::binary);
@@ -151,17 +152,16 @@ bool StoreWriter::EnsureOpen(const StoreLocation& location, bool create) {
 }
 
 bool StoreWriter::Open(const StoreLocation& location, bool create) {
-  std::filesystem::path file(location.file);
+  // The folder is made only for a store about to be created; either way it
+  // and the store's files are reached through no link of someone else's.
+  const StoreFile placed = PlaceStoreFile(platform::OpenTrustedFolder(location.folder, create),
+                                          std::filesystem::path(location.file).filename().native());
+  if (placed.path.empty()) return false;
+  const std::filesystem::path file(placed.path);
   FileState state = Classify(file);
-  if (state == FileState::kUnusable) return false;
-  if (state == FileState::kMissing) {
-    if (!create) return false;
-    if (!platform::DirectoryExists(location.folder) &&
-        !platform::CreateDirectories(location.folder)) {
-      return false;
-    }
-  }
-  db_ = OpenDatabase(file.u8string(), SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, nullptr);
+  if (state == FileState::kUnusable || (state == FileState::kMissing && !create)) return false;
+  db_ = OpenDatabase(file.u8string(),
+                     SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOFOLLOW, nullptr);
   // SQLite quietly falls back to reading a file it may not write.
   if (!db_ || sqlite3_db_readonly(db_.get(), "main") != 0) return false;
   sqlite3* db = db_.get();
