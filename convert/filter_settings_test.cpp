@@ -37,11 +37,6 @@ struct Migrator : CHFMigrator {
   Migrator() { m_ServerDirectory = wxString("C:\\Server"); }
 };
 
-// The output type keys, set to PostScript or to PDF.
-const std::string kPs = "OUTPUTFILETYPEPDF=0;OUTPUTFILETYPEPS=1;";
-const std::string kPdf = "OUTPUTFILETYPEPDF=1;OUTPUTFILETYPEPS=0;";
-const std::string kDcs = kPs + "SELECTEDDISTILLERPROFILE=;COMBINEALLFILES=0;";
-
 // The legacy and the converted map of each step, by the step's name.
 #define MAPS(legacy) &CHFMigrator::m_##legacy, &CHFMigrator::m_##legacy##Conv
 const std::map<std::string, std::pair<MapPtr, MapPtr>> kMaps = {
@@ -53,7 +48,6 @@ struct Step {
   std::string name;
   MapPtr legacy;
   MapPtr converted;
-  bool switched;      // whether "PDFCONVERSION" sets its output type
   std::string fixed;  // what a legacy map holding only an unknown key gives
 };
 
@@ -65,14 +59,9 @@ std::vector<Step> Steps() {
   for (const CaseRow& row : kCases) {
     if (row.at(0) != "step") continue;
     const auto& [legacy, converted] = kMaps.at(row.at(1));
-    steps.push_back({row[1], legacy, converted, row.at(2) == "1", row.at(3)});
+    steps.push_back({row[1], legacy, converted, row.at(2)});
   }
   return steps;
-}
-
-std::string MsOffice(const std::string& printer) {
-  return "COLOR=Color;PRINTSHADOWS=205;FRAMESLIDES=0;PRINTOUTPUTTYPE=Slides;PRINTER=" + printer +
-         ";OUTPUTFILE=PS;SCALETOFITPAGE=0;";
 }
 
 // Converts `legacy` in step `step` of a fresh engine whose converted map
@@ -120,36 +109,27 @@ TEST(FilterSettings, EveryRowOfEveryStep) {
   EXPECT_EQ(Dump(empty.m_FilterEnable) + Dump(empty.m_FilterSettings), "");
 }
 
-// Every legacy filter but EPS holds a key of no row. The PDF switch sets the
-// output type of five maps, the empty EPS one included, and the PEX filter's
-// enable text forces PDF/X: each only on exactly "1". Reading the settings
-// inserts nothing.
-TEST(FilterSettings, PdfSwitchAndForcedPdfxOnlyOnOne) {
+// The PDF switch and the PEX filter's enable text, one of the values of a
+// "switch" row in both, each legacy filter but EPS holding a key of no row,
+// with the row's FILTERSETTINGS entries: the maps written, shown as the row
+// shows them. Reading the settings inserts nothing.
+TEST(FilterSettings, PdfSwitchAndForcedPdfx) {
   const std::vector<Step> steps = Steps();
-  for (std::string value : {"", "1", "0", "true", " 1"}) {
-    Migrator m;
-    for (const Step& step : steps) Fill(m.*step.legacy, step.name == "EPS" ? "" : "U=1");
-    if (!value.empty()) Fill(m.m_FilterSettings, "PDFCONVERSION=" + value);
-    m.m_FilterEnable.GetOrInsert("PEXFILTER") = value;
-    m.ConvertFilterSettings();
-    const bool on = value == "1";
-    EXPECT_EQ(Dump(m.m_FilterSettings) + Dump(m.m_FilterEnable),
-              (value.empty() ? "" : "PDFCONVERSION=" + value + ";") + "PEXFILTER=" + value + ";");
-    EXPECT_EQ(Dump(m.m_MsOffice), MsOffice("Adobe PDF") + (on ? kPdf : "")) << value;
-    EXPECT_EQ(Dump(m.m_Dcs2FilterConv), kDcs) << value;
-    EXPECT_EQ(Dump(m.m_Eps2PsFilterConv), on ? kPdf : "") << value;
-    for (const Step& step : steps) {
-      if (step.name == "EPS") continue;
-      std::string expected = step.fixed;
-      if (on && step.switched && expected.rfind(kPs, 0) == 0) expected.replace(0, kPs.size(), kPdf);
-      if (on && step.legacy == &CHFMigrator::m_PexFilter) expected.replace(0, 11, "FORCEPDFX=1");
-      EXPECT_EQ(Dump(m.*step.converted), expected) << step.name << " " << value;
+  for (const CaseRow& row : kCases) {
+    std::istringstream values(row.at(0) == "switch" ? row.at(1) : "");
+    for (std::string value; std::getline(values, value, '|');) {
+      Migrator m;
+      for (const Step& step : steps) Fill(m.*step.legacy, step.name == "EPS" ? "" : "U=1");
+      Fill(m.m_FilterSettings, row.at(2) + (value.empty() ? "" : "PDFCONVERSION=" + value));
+      m.m_FilterEnable.GetOrInsert("PEXFILTER") = value;
+      const std::string given = Dump(m.m_FilterSettings) + Dump(m.m_FilterEnable);
+      m.ConvertFilterSettings();
+      std::string maps = Dump(m.m_MsOffice) + "\n" + Dump(m.m_Dcs2FilterConv);
+      for (const Step& step : steps) maps += "\n" + Dump(m.*step.converted);
+      EXPECT_EQ(Dump(m.m_FilterSettings) + Dump(m.m_FilterEnable), given);
+      EXPECT_EQ(maps, row.at(3)) << "'" << value << "'";
     }
   }
-  Migrator named;
-  Fill(named.m_FilterSettings, "PRINTERNAME=Plotter 7");
-  named.ConvertFilterSettings();
-  EXPECT_EQ(Dump(named.m_MsOffice), MsOffice("Plotter 7"));
 }
 
 }  // namespace
