@@ -11,7 +11,7 @@ const int kStartupWaitSeconds = 7;
 
 }  // namespace
 
-CHFGuiApp::CHFGuiApp() : m_Version("1.0.0.1") {}
+CHFGuiApp::CHFGuiApp() : m_Version(HF_VERSION) {}  // the project's version, "1.0.0.1"
 
 CHFGuiApp::~CHFGuiApp() = default;
 

@@ -37,3 +37,36 @@ if [[ "$subsystem" != *"(Windows GUI)"* ]]; then
   echo "build_win64: hfmigrate.exe is not a GUI-subsystem program" >&2
   exit 1
 fi
+
+# What Windows reads before a shipped program runs: its manifest (the
+# execution level asked for, long paths, the supported systems, no code-page
+# override) and its version resource, with the project's version. An
+# executable without them is refused.
+version="$(sed -n 's/^CMAKE_PROJECT_VERSION:STATIC=//p' build-win64/CMakeCache.txt)"
+check_resources() {
+  local exe=$1 level=$2 rc problem
+  # windres fails on an executable without any resource: nothing to read.
+  rc="$(x86_64-w64-mingw32-windres -i "$exe" -O rc 2>/dev/null)" || rc=""
+  problem="$(perl -0777 -e '
+    my ($level, $version) = @ARGV; my $rc = <STDIN>; my @missing;
+    my ($block) = $rc =~ m{^1 24 /\* RT_MANIFEST \*/\nBEGIN\n(.*?)\nEND$}ms;
+    my $xml = join "", map { s/^\s*"//; s/"\s*$//; s/""/"/g; s/\\n/\n/g; $_ } split /\n/, $block // "";
+    $xml =~ s/<!--.*?-->//gs;
+    push @missing, "a manifest" unless $xml =~ /<assembly\b/;
+    push @missing, "requestedExecutionLevel $level"
+      unless $xml =~ /<requestedExecutionLevel\s+level="\Q$level\E"/;
+    push @missing, "longPathAware" unless $xml =~ m{<longPathAware\b[^>]*>\s*true\s*</longPathAware>};
+    push @missing, "the Windows 10/11 and Server 2016-2022 entry"
+      unless $xml =~ /<supportedOS\s+Id="\{8e0f7a12-bfb3-4fe8-b9a5-48fd50a15a9a\}"/;
+    push @missing, "no code-page override" if $xml =~ /activeCodePage/;
+    push @missing, "a version resource of $version"
+      unless $rc =~ /^1 VERSIONINFO$/m && $rc =~ /VALUE "FileVersion", "\Q$version\E"/
+        && $rc =~ /VALUE "ProductName", "[^"]+"/ && $rc =~ /VALUE "FileDescription", "[^"]+"/;
+    print join(", ", @missing);' "$level" "$version" <<<"$rc")"
+  if [ -n "$problem" ]; then
+    echo "build_win64: $exe lacks $problem" >&2
+    exit 1
+  fi
+}
+check_resources build-win64/bin/hfmigrate.exe requireAdministrator
+check_resources build-win64/bin/hfstore.exe asInvoker
