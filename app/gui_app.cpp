@@ -2,6 +2,9 @@
 
 #include <wx/utils.h>
 
+#include <vector>
+
+#include "app/run_mutex.h"
 #include "platform/platform.h"
 #include "server/server_process.h"
 
@@ -16,14 +19,19 @@ CHFGuiApp::CHFGuiApp() : m_Version(HF_VERSION) {}  // the project's version, "1.
 CHFGuiApp::~CHFGuiApp() = default;
 
 bool CHFGuiApp::OnInit() {
+  // Another run is under way: this one changes nothing, not even the server.
+  if (!platform::HoldNamedMutex(kRunMutex)) return false;
   bool started_by_us = false;
+  std::vector<platform::ProcessId> running_before;
   if (!platform::NamedMutexExists(kServerMutex)) {
+    // Whatever runs now is not the server this run starts, whatever its
+    // name; without that list the stop cannot tell, so nothing is stopped.
+    started_by_us = platform::EnumerateProcesses(&running_before, platform::kAllProcesses);
     platform::LaunchDetached(kServerExecutable);  // outcome deliberately not examined
     wxSleep(kStartupWaitSeconds);
-    started_by_us = true;
   }
   m_Engine.Run();
-  if (started_by_us) StopServer();
+  if (started_by_us) StopServer(running_before);
   return false;
 }
 

@@ -154,8 +154,11 @@ bool IsLink(const HostPath& host_path);
 
 // ---- Named mutex ----------------------------------------------------------
 
-// True while some process holds a named mutex of that name that can be opened
-// with full access. The probe opens nothing for longer than the call.
+// True while a named mutex of that name exists: one that opens with full
+// access, one that exists but refuses that access (its holder runs with
+// more rights), and on Windows one in the global namespace ("Global\" and
+// the name: a service's) as well as one in this session's. The probe opens
+// nothing for longer than the call.
 bool NamedMutexExists(const std::wstring& name);
 
 // Takes the named mutex for the rest of this process's life. False when
@@ -173,9 +176,10 @@ constexpr std::size_t kMaxProcesses = 1024;
 // without waiting for it. Answers whether it was started.
 bool LaunchDetached(const std::wstring& file_name);
 
-// The identifiers of the running processes, at most kMaxProcesses of them, in
-// the host's enumeration order. False when the enumeration fails.
-bool EnumerateProcesses(std::vector<ProcessId>* ids);
+// The identifiers of the running processes, at most `limit` of them, in the
+// host's enumeration order. False when the enumeration fails.
+constexpr std::size_t kAllProcesses = static_cast<std::size_t>(-1);
+bool EnumerateProcesses(std::vector<ProcessId>* ids, std::size_t limit = kMaxProcesses);
 
 // Module names are read as the Windows build reads them, into buffers of the
 // classic path length: a name of more characters is cut to the first

@@ -9,6 +9,7 @@
 // server starting up would find the mutex held and give up. Unlike classic
 // fcntl locks, an OFD lock is also not lost when the holding process closes
 // some other descriptor of the same file.
+#include <errno.h>
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -64,8 +65,10 @@ bool NamedMutexExists(const std::wstring& name) {
   const std::string file = LockFile(name);
   if (file.empty()) return false;
   // A missing lock file is a mutex nobody holds; the probe creates nothing.
+  // One the probe may not open belongs to a holder with other rights, and
+  // counts as held, as a mutex that refuses access does on Windows.
   const int fd = open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW);
-  if (fd < 0) return false;
+  if (fd < 0) return errno == EACCES;
   struct flock lock = WholeFileWriteLock();
   const bool held = fcntl(fd, F_OFD_GETLK, &lock) == 0 && lock.l_type != F_UNLCK;
   close(fd);
@@ -82,7 +85,8 @@ bool HoldNamedMutex(const std::wstring& name) {
   const std::lock_guard<std::mutex> lock_held(guard);
   if (std::find(held.begin(), held.end(), file) != held.end()) return true;
   if (!posix::CreateHostDirectories(LockDirectory())) return false;
-  const int fd = open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
+  // Readable by all, so that any user's probe can see whether it is held.
+  const int fd = open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644);
   if (fd < 0) return false;
   struct flock lock = WholeFileWriteLock();
   if (fcntl(fd, F_OFD_SETLK, &lock) != 0) {

@@ -98,7 +98,7 @@ bool LaunchDetached(const std::wstring& file_name) {
   return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }
 
-bool EnumerateProcesses(std::vector<ProcessId>* ids) {
+bool EnumerateProcesses(std::vector<ProcessId>* ids, std::size_t limit) {
   if (ids == nullptr) return false;
   DIR* proc = opendir("/proc");
   if (proc == nullptr) return false;
@@ -109,7 +109,7 @@ bool EnumerateProcesses(std::vector<ProcessId>* ids) {
   }
   closedir(proc);
   std::sort(found.begin(), found.end());
-  if (found.size() > kMaxProcesses) found.resize(kMaxProcesses);
+  if (found.size() > limit) found.resize(limit);
   *ids = std::move(found);
   return true;
 }

@@ -405,11 +405,21 @@ TrustedFolder CheckTrustedHostFolder(const HostPath& host_path) {
 
 // ---- Named mutex ------------------------------------------------------------
 
+// A mutex that refuses the access asked for exists all the same: its holder
+// runs elevated or as another user. A service's server holds its mutex in
+// the global namespace, which a name without a namespace does not reach from
+// a user's session.
 bool NamedMutexExists(const std::wstring& name) {
   // An empty name would open nothing named; it is no mutex.
   if (name.empty() || HasNul(name)) return false;
-  ScopedHandle mutex(OpenMutexW(kMutexAllAccess, FALSE, name.c_str()));
-  return mutex.get() != nullptr;
+  const auto exists = [](const std::wstring& full_name) {
+    ScopedHandle mutex(OpenMutexW(kMutexAllAccess, FALSE, full_name.c_str()));
+    return mutex.get() != nullptr || GetLastError() == ERROR_ACCESS_DENIED;
+  };
+  if (exists(name)) return true;
+  const bool has_namespace =
+      _wcsnicmp(name.c_str(), L"Global\\", 7) == 0 || _wcsnicmp(name.c_str(), L"Local\\", 6) == 0;
+  return !has_namespace && exists(L"Global\\" + name);
 }
 
 bool HoldNamedMutex(const std::wstring& name) {
@@ -457,15 +467,20 @@ bool LaunchDetached(const std::wstring& file_name) {
   return true;
 }
 
-bool EnumerateProcesses(std::vector<ProcessId>* ids) {
+bool EnumerateProcesses(std::vector<ProcessId>* ids, std::size_t limit) {
   if (ids == nullptr) return false;
-  std::vector<DWORD> table(kMaxProcesses, 0);
+  // The system does not say how many there are: a table it fills may mean
+  // that more did not fit, so a larger one is tried up to the limit.
+  std::vector<DWORD> table(std::min(limit, kMaxProcesses), 0);
   DWORD bytes = 0;
-  if (!K32EnumProcesses(table.data(), static_cast<DWORD>(table.size() * sizeof(DWORD)), &bytes)) {
-    return false;
+  for (;;) {
+    if (!K32EnumProcesses(table.data(), static_cast<DWORD>(table.size() * sizeof(DWORD)), &bytes)) {
+      return false;
+    }
+    if (bytes < table.size() * sizeof(DWORD) || table.size() >= limit) break;
+    table.assign(std::min(limit, table.size() * 2), 0);
   }
-  std::size_t count = bytes / sizeof(DWORD);
-  if (count > kMaxProcesses) count = kMaxProcesses;
+  const std::size_t count = std::min<std::size_t>(bytes / sizeof(DWORD), table.size());
   ids->assign(table.begin(), table.begin() + count);
   return true;
 }

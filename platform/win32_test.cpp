@@ -80,16 +80,23 @@ TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
   // A NUL must not cut the name short to the held one's.
   EXPECT_FALSE(platform::NamedMutexExists(name + std::wstring(1, L'\0') + L"more"));
   CloseHandle(held);
-  // A mutex that grants only waiting on it does not count as the server's.
+  // A mutex that grants only waiting on it exists all the same: its holder
+  // runs with more rights than the probe.
   PSECURITY_DESCRIPTOR descriptor = nullptr;
   ASSERT_TRUE(ConvertStringSecurityDescriptorToSecurityDescriptorW(
       L"D:(A;;0x100000;;;WD)", SDDL_REVISION_1, &descriptor, nullptr));
   SECURITY_ATTRIBUTES synchronize_only = {sizeof(synchronize_only), descriptor, FALSE};
   HANDLE restricted = CreateMutexW(&synchronize_only, FALSE, name.c_str());
   ASSERT_NE(restricted, nullptr);
-  EXPECT_FALSE(platform::NamedMutexExists(name));
+  EXPECT_TRUE(platform::NamedMutexExists(name));
   CloseHandle(restricted);
   LocalFree(descriptor);
+  EXPECT_FALSE(platform::NamedMutexExists(name)) << "closed";
+  // A service's mutex, in the global namespace, is seen from the session too.
+  HANDLE global = CreateMutexW(nullptr, FALSE, (L"Global\\" + name).c_str());
+  ASSERT_NE(global, nullptr);
+  EXPECT_TRUE(platform::NamedMutexExists(name));
+  CloseHandle(global);
 
   // Cut at the NUL, the name would be the key, which exists.
   EXPECT_FALSE(platform::HklmKeyOpensForRead(key + std::wstring(1, L'\0') + L"\\Missing"));

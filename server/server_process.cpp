@@ -1,5 +1,6 @@
 #include "server/server_process.h"
 
+#include <algorithm>
 #include <cwctype>
 #include <vector>
 
@@ -17,10 +18,13 @@ bool SameIgnoringCase(const std::wstring& a, const std::wstring& b) {
 
 }  // namespace
 
-void StopServer() {
+void StopServer(const std::vector<platform::ProcessId>& running_before) {
   std::vector<platform::ProcessId> ids;
   if (!platform::EnumerateProcesses(&ids)) return;
   for (platform::ProcessId id : ids) {
+    if (std::find(running_before.begin(), running_before.end(), id) != running_before.end()) {
+      continue;
+    }
     std::wstring base_name;
     if (!platform::QueryProcessModule(id, &base_name, nullptr)) continue;
     if (!SameIgnoringCase(base_name, kServerExecutable)) continue;

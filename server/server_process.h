@@ -7,14 +7,19 @@
 #define HF_SERVER_SERVER_PROCESS_H_
 
 #include <string>
+#include <vector>
+
+#include "platform/platform.h"
 
 inline constexpr wchar_t kServerExecutable[] = L"hotfolder.exe";
 inline constexpr wchar_t kServerMutex[] = L"KYR Dirorodiv - Server";
 
-// Ends the first listed process that can be opened and whose module is named
-// "hotfolder.exe" in any letter case. It need not be the one this run
-// launched: the server is known by name only. At most one process ends.
-void StopServer();
+// Ends the first listed process that can be opened, whose module is named
+// "hotfolder.exe" in any letter case and that is not one of
+// `running_before`. It need not be the one this run launched (that one may
+// hand over to another process), but it is never a server that ran before
+// the launch, such as another session's. At most one process ends.
+void StopServer(const std::vector<platform::ProcessId>& running_before);
 
 // Overwrites `directory` with the directory (no trailing separator) of the
 // first listed process whose module is named exactly "hotfolder.exe" and
