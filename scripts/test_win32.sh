@@ -8,7 +8,8 @@
 #     byte-identical;
 #   - start-up: with no server running, hotfolder.exe is launched from the
 #     tool's directory, awaited and stopped; with one running, it is neither
-#     awaited nor stopped; the exit status is -1 either way. The demo runs
+#     awaited nor stopped; the exit status is -1 either way. A second run
+#     started while the first waits leaves at once and changes nothing. The demo runs
 #     with no server, from the server's directory, the only place a stand-in
 #     is: the store records the running server's directory (the PDF filter's
 #     error path), so a stand-in not launched from there shows as a
@@ -125,15 +126,20 @@ wine_server_running() {
   fail "the stand-in probe ended with status $status"
 }
 
-# Starts the stand-in from the server directory, and returns once it runs.
-start_wine_server() {
-  (WINEPREFIX=$1 wine "$server_dir\\hotfolder.exe" >/dev/null 2>&1 &)
+# Returns once a server runs in Wine prefix $1.
+await_wine_server() {
   local _
   for _ in $(seq 60); do
     sleep 0.5
     wine_server_running "$1" && return 0
   done
   fail "the stand-in did not start under Wine"
+}
+
+# Starts the stand-in from the server directory, and returns once it runs.
+start_wine_server() {
+  (WINEPREFIX=$1 wine "$server_dir\\hotfolder.exe" >/dev/null 2>&1 &)
+  await_wine_server "$1"
 }
 
 start_linux_server() {
@@ -208,7 +214,17 @@ compare() {
   place l "$l/$host_dir" hfmigrate
 
   if [ "$server" = absent ]; then
-    timed_run "$w" wine "$dir\\hfmigrate.exe"
+    # While the first run waits for the server it started, a second one
+    # leaves at once and changes nothing.
+    drive_d_tree "$w" >"$scratch/$name-before.tree"
+    timed_run "$w" wine "$dir\\hfmigrate.exe" &
+    local first=$!
+    await_wine_server "$w"
+    (scratch=$scratch/second && mkdir "$scratch" && timed_run "$w" wine "$dir\\hfmigrate.exe" &&
+      check_run "$name under Wine, a second run meanwhile" lt 5)
+    drive_d_tree "$w" | cmp -s - "$scratch/$name-before.tree" ||
+      fail "$name under Wine: a second run changed drive D while the first one ran"
+    wait "$first"
     check_run "$name under Wine, no server running" ge 7
     ! wine_server_running "$w" || fail "$name under Wine: the started server was not stopped"
   else
