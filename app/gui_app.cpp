@@ -1,5 +1,7 @@
 #include "app/gui_app.h"
 
+#include <wx/debug.h>
+#include <wx/init.h>
 #include <wx/utils.h>
 
 #include <vector>
@@ -39,4 +41,23 @@ int CHFGuiApp::OnExit() {
   return 0;
 }
 
-wxIMPLEMENT_APP_CONSOLE(CHFGuiApp);
+wxIMPLEMENT_APP_NO_MAIN(CHFGuiApp);
+
+// The entry point on every host, as wxIMPLEMENT_APP_CONSOLE would write it,
+// but with the GUI library's assertions off in every build before any of it
+// runs: on Windows a failed one opens a modal message box even in a console
+// program, and nothing may wait for a click on an unattended server. (The
+// Windows executables cannot open one anyway: platform/win32_no_dialogs.)
+#ifdef _WIN32
+int main(int, char**) {
+  wxDisableAsserts();
+  wxDISABLE_DEBUG_LOGGING_IN_RELEASE_BUILD();
+  return wxEntry();  // the library reads the wide command line itself
+}
+#else
+int main(int argc, char** argv) {
+  wxDisableAsserts();
+  wxDISABLE_DEBUG_LOGGING_IN_RELEASE_BUILD();
+  return wxEntry(argc, argv);
+}
+#endif

@@ -1,6 +1,7 @@
 // hfstore: shows what the configuration store holds. It only reads; a
 // missing store stays missing.
 #include <wx/cmdline.h>
+#include <wx/debug.h>
 #include <wx/init.h>
 
 #include <clocale>
@@ -139,6 +140,9 @@ int Run(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  // No assertion of the GUI library may stop a check that a script runs: on
+  // Windows a failed one would open a message box and wait for a click.
+  wxDisableAsserts();
   // Arguments (a store path) arrive in the user's encoding.
   std::setlocale(LC_CTYPE, "");
   wxInitializer initializer(argc, argv);

@@ -38,6 +38,16 @@ if [[ "$subsystem" != *"(Windows GUI)"* ]]; then
   exit 1
 fi
 
+# No dialog: the shipped executables import no message box (the GUI
+# library's assertion alert and last-resort error message are answered by
+# platform/win32_no_dialogs.cpp), so nothing can wait for a click.
+for exe in build-win64/bin/hfmigrate.exe build-win64/bin/hfstore.exe; do
+  if x86_64-w64-mingw32-objdump -p "$exe" | grep -qiE 'MessageBox|TaskDialog'; then
+    echo "build_win64: $exe can open a message box" >&2
+    exit 1
+  fi
+done
+
 # What Windows reads before a shipped program runs: its manifest (the
 # execution level asked for, long paths, the supported systems, no code-page
 # override) and its version resource, with the project's version. An
