@@ -16,6 +16,10 @@ void CHFMigrator::MigrateFolders() {
   // copies of every outcome so far each time the list grows.
   m_Status.Alloc(m_Status.size() + m_Folders.size());
   for (std::size_t i = 0; i < m_Folders.size(); ++i) {
+    if (m_UndecodedPaths.count(i) != 0) {
+      m_Status.Add("Failed; Path not decodable");
+      continue;
+    }
     if (!ReadFolderConfiguration(*this, i)) {
       m_Status.Add("Failed; File missing");
       continue;

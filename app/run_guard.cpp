@@ -53,6 +53,7 @@ void CHFMigrator::BeginRun() {
   // The folders this run will retire: those the folder reader will find.
   // One that has a retired directory already keeps it, as the move fails.
   for (const wxString& folder : m_Folders) {
+    if (folder.empty()) continue;  // a path the host could not decode names nothing
     if (!platform::FileExists(LegacyConfigPath(folder).ToStdWstring())) continue;
     const FolderPaths paths = MakeFolderPaths(folder);
     entries.push_back({folder, !platform::DirectoryExists(paths.retired.ToStdWstring())});

@@ -12,6 +12,7 @@
 
 #include <map>
 #include <optional>
+#include <string>
 #include <utility>
 
 #include "engine/settings_map.h"
@@ -58,6 +59,9 @@ class CHFMigrator {
   wxArrayString m_Folders;       // legacy folder paths, in list-file order
   wxArrayString m_Status;        // one outcome text per folder
   wxArrayString m_EnabledFlags;  // "1" or "0", parallel to m_Folders
+  // The bytes of each listed path the host could not decode, by its index
+  // in m_Folders, where its entry is empty: such a folder is never touched.
+  std::map<std::size_t, std::string> m_UndecodedPaths;
   bool m_CurrentEnabled = true;  // the folder now being converted
   bool m_RunRecorded = false;    // BeginRun left the record of this run
 

@@ -36,7 +36,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   FUZZ_CHECK(!read || WholeRecords(size) >= 1);
   for (std::size_t i = 0; i < engine.m_Folders.size(); ++i) {
     const wxString& folder = engine.m_Folders[i];
-    FUZZ_CHECK(!folder.empty());
+    // Empty exactly where a path did not decode, which keeps its place.
+    FUZZ_CHECK(folder.empty() == (engine.m_UndecodedPaths.count(i) != 0));
     FUZZ_CHECK(folder.length() <= kPathSize);
     FUZZ_CHECK(folder.Find(wxUniChar(0)) == wxNOT_FOUND);
     FUZZ_CHECK(engine.m_EnabledFlags[i] == "1" || engine.m_EnabledFlags[i] == "0");

@@ -9,20 +9,25 @@
 #include <string>
 #include <vector>
 
-#include "engine/migrator.h"
 #include "convert/settings_dir.h"
+#include "engine/migrator.h"
 #include "engine/run_record.h"
 #include "store/store_reader.h"
 
 namespace {
 
-enum Result { kMigrated, kNotMigrated, kInterrupted, kDiffers, kNotRetired, kResults };
+enum Result { kMigrated, kNotMigrated, kInterrupted, kDiffers, kNotRetired, kUndecoded, kResults };
 
 // What each result is called, in lines and in the summary; whether it
 // leaves a folder that had legacy settings short of migrated as listed is
 // decided per folder (a folder without any folder.cfg had none).
 const char* const kResultNames[kResults] = {
-    "migrated", "not migrated", "interrupted", "enabled state differs", "settings not retired",
+    "migrated",
+    "not migrated",
+    "interrupted",
+    "enabled state differs",
+    "settings not retired",
+    "path not decodable",
 };
 
 struct FolderCheck {
@@ -81,6 +86,33 @@ FolderCheck CheckFolder(const Sources& sources, const wxString& folder, bool lis
       check.detail += "; " + paths.retired + " is left alone: no interrupted run retired it";
     }
   }
+  return check;
+}
+
+// A listed path whose bytes the host could not decode: nothing can find its
+// folder, so it counts against the run. It is shown as its bytes, those
+// outside printable ASCII (and a backslash before an "x") written as \xHH.
+FolderCheck CheckUndecoded(const std::string& bytes, bool listed_enabled) {
+  static const char kHex[] = "0123456789ABCDEF";
+  std::string shown;
+  for (std::size_t i = 0; i < bytes.size(); ++i) {
+    const unsigned char byte = static_cast<unsigned char>(bytes[i]);
+    const bool escaped =
+        byte < 0x20 || byte > 0x7E || (byte == '\\' && i + 1 < bytes.size() && bytes[i + 1] == 'x');
+    if (escaped) {
+      shown += {'\\', 'x', kHex[byte >> 4], kHex[byte & 0xF]};
+    } else {
+      shown.push_back(static_cast<char>(byte));
+    }
+  }
+  FolderCheck check;
+  check.result = kUndecoded;
+  check.counts_against = true;
+  check.folder = wxString::FromUTF8(shown.data(), shown.size());
+  check.detail =
+      "the list's bytes for this path do not decode in this machine's ANSI code page: "
+      "hfmigrate cannot find the folder";
+  check.listed_enabled = listed_enabled;
   return check;
 }
 
@@ -166,7 +198,10 @@ int RunCheck(const platform::HostPath& store_file, bool json) {
   for (std::size_t i = 0; i < engine.m_Folders.size(); ++i) {
     const bool listed_enabled =
         i >= engine.m_EnabledFlags.size() || engine.m_EnabledFlags[i] != "0";
-    checks.push_back(CheckFolder(sources, engine.m_Folders[i], listed_enabled));
+    const auto undecoded = engine.m_UndecodedPaths.find(i);
+    checks.push_back(undecoded != engine.m_UndecodedPaths.end()
+                         ? CheckUndecoded(undecoded->second, listed_enabled)
+                         : CheckFolder(sources, engine.m_Folders[i], listed_enabled));
     ++counts[checks.back().result];
     ok = ok && !checks.back().counts_against;
   }

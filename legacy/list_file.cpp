@@ -10,7 +10,6 @@
 #include <fstream>
 
 #include "engine/migrator.h"
-#include "legacy/cp1252.h"
 #include "platform/platform.h"
 
 namespace {
@@ -48,14 +47,9 @@ bool HeaderIsValid(const char* header) {
 
 // The path ends at its first zero byte, or at the end of the field when the
 // writer filled all of it.
-wxString DecodePath(const char* field) {
+std::string PathBytes(const char* field) {
   const void* zero = std::memchr(field, '\0', kPathSize);
-  std::size_t length = zero ? static_cast<const char*>(zero) - field : kPathSize;
-#ifdef _WIN32
-  return wxString(field, wxConvLibc, length);
-#else
-  return DecodeCp1252(field, length);
-#endif
+  return std::string(field, zero ? static_cast<const char*>(zero) - field : kPathSize);
 }
 
 unsigned RecordState(const char* record) {
@@ -108,9 +102,17 @@ bool CHFMigrator::ReadLegacyList() {
   char record[kRecordSize];
   while (in.read(record, kRecordSize)) {
     read_any = true;
-    wxString path = DecodePath(record + kPathOffset);
-    if (path.empty()) continue;
-    m_Folders.Add(path);
+    // In the code page the legacy service wrote them in, the host's ANSI
+    // one. A path it cannot decode keeps its place, as an empty entry that
+    // names nothing, so that it gets an outcome and hfstore check names it.
+    const std::string bytes = PathBytes(record + kPathOffset);
+    if (bytes.empty()) continue;
+    std::wstring path;
+    if (!platform::DecodeAnsiText(bytes, &path) || path.empty()) {
+      m_UndecodedPaths[m_Folders.size()] = bytes;
+      path.clear();
+    }
+    m_Folders.Add(wxString(path));
     m_EnabledFlags.Add(RecordState(record) == kStateEnabled ? "1" : "0");
   }
   return read_any;

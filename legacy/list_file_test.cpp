@@ -30,7 +30,8 @@ TEST(ReadLegacyList, FileLayouts) {
     const char* name;
     std::string bytes;  // "<none>" for no file at all, "<fifo>" for a FIFO
     bool result;
-    std::wstring folders;  // "flag path;" for each listed folder
+    std::wstring folders;  // "flag path;" for each listed folder, "flag !bytes;" undecoded
+    bool utf8 = false;     // the prefix's ANSI code page is UTF-8
   } cases[] = {
       {"header only", List({}), false, L""},
       {"wrong magic", Patched(one, 22, "f"), false, L""},
@@ -57,11 +58,16 @@ TEST(ReadLegacyList, FileLayouts) {
       {"partial record only", one.substr(0, 40 + 263), false, L""},
       {"Windows-1252 path", List({{"D:\\\x80 \x81\x8a\x9f\xe9\xff", 2}}), true,
        L"1 D:\\\u20AC \u0081\u0160\u0178\u00E9\u00FF;"},
+      // A path that does not decode keeps its place, and nothing else is lost.
+      {"UTF-8 code page",
+       List({{"D:\\caf\xc3\xa9", 2}, {"D:\\caf\xe9", 0}, {"D:\\\xef\xbf\xbd", 2}}), true,
+       L"1 D:\\caf\u00e9;0 !D:\\caf\u00e9;1 D:\\\uFFFD;", true},
   };
   alarm(60);  // a read that blocks ends the process: a hang fails
   for (const auto& c : cases) {
     SCOPED_TRACE(c.name);
     TempPrefix prefix;
+    if (c.utf8) UseUtf8AnsiCodePage(prefix);
     if (c.bytes[0] != '<') prefix.WriteFile(LegacyListHostPath(prefix), c.bytes);
     if (c.bytes == "<fifo>") {
       std::filesystem::create_directories(LegacyListHostPath(prefix).parent_path());
@@ -72,9 +78,22 @@ TEST(ReadLegacyList, FileLayouts) {
     ASSERT_EQ(engine.m_Folders.size(), engine.m_EnabledFlags.size());
     std::wstring folders;
     for (std::size_t i = 0; i < engine.m_Folders.size(); ++i) {
-      folders += (engine.m_EnabledFlags[i] + " " + engine.m_Folders[i] + ";").ToStdWstring();
+      const auto undecoded = engine.m_UndecodedPaths.find(i);
+      const wxString path =
+          undecoded == engine.m_UndecodedPaths.end()
+              ? engine.m_Folders[i]
+              : "!" + wxString(undecoded->second.data(), wxConvISO8859_1, undecoded->second.size());
+      EXPECT_EQ(engine.m_Folders[i].empty(), undecoded != engine.m_UndecodedPaths.end());
+      folders += (engine.m_EnabledFlags[i] + " " + path + ";").ToStdWstring();
     }
     EXPECT_EQ(folders, c.folders);
+    // Each gets an outcome; one without a path never reaches the folder reader.
+    engine.MigrateFolders();
+    ASSERT_EQ(engine.m_Status.size(), engine.m_Folders.size());
+    for (std::size_t i = 0; i < engine.m_Status.size(); ++i) {
+      EXPECT_EQ(engine.m_Status[i], engine.m_UndecodedPaths.count(i) ? "Failed; Path not decodable"
+                                                                     : "Failed; File missing");
+    }
   }
   alarm(0);
 }

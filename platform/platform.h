@@ -65,6 +65,17 @@ std::wstring CommonAppDataFolder();
 // anything was removed.
 bool RemoveFileSpec(std::wstring* path);
 
+// ---- Text -----------------------------------------------------------------
+
+// Decodes narrow text that a program wrote through the Windows ANSI API (the
+// legacy list's paths) in the host's ANSI code page: on Windows the
+// machine's; on POSIX hosts the prefix's, as Wine records it in system.reg
+// ("ACP" under System\CurrentControlSet\Control\Nls\CodePage):
+// UTF-8 (65001) where it says so, else Windows-1252, which decodes every
+// byte. False, leaving `text` as it was, for bytes the code page cannot
+// decode.
+bool DecodeAnsiText(const std::string& bytes, std::wstring* text);
+
 // ---- Files ----------------------------------------------------------------
 
 constexpr std::uint32_t kAttributeReadOnly = 0x1;

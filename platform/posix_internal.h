@@ -41,6 +41,10 @@ struct MappedPath {
 // relative while the current directory lies outside every drive).
 MappedPath MapWindowsPath(const std::wstring& windows_path);
 
+// The ANSI code page the prefix records for Windows programs ("ACP" in
+// system.reg), read once per prefix; 0 when it records none.
+unsigned PrefixAnsiCodePage();
+
 // Creates a host directory and its missing parents (mode 0777 less umask).
 bool CreateHostDirectories(const std::string& host_path);
 

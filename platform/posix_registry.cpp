@@ -8,7 +8,10 @@
 // with backslashes doubled, "[" and "]" in names escaped with a backslash,
 // and other characters outside printable ASCII written as \x followed by up
 // to four hex digits.
+#include <cstdlib>
 #include <fstream>
+#include <mutex>
+#include <string>
 
 #include "platform/platform.h"
 #include "platform/posix_internal.h"
@@ -80,6 +83,35 @@ bool OpensKey(const std::wstring& section, const std::wstring& key) {
 }
 
 }  // namespace
+
+namespace posix {
+
+unsigned PrefixAnsiCodePage() {
+  static std::mutex guard;
+  static std::string read_for;
+  static unsigned code_page = 0;
+  const std::lock_guard<std::mutex> lock(guard);
+  const std::string prefix = PrefixDirectory();
+  if (prefix == read_for) return code_page;
+  read_for = prefix;
+  code_page = 0;
+  std::ifstream hive(prefix + "/system.reg", std::ios::binary);
+  const std::wstring key = L"System\\CurrentControlSet\\Control\\Nls\\CodePage";
+  std::string line;
+  std::wstring section;
+  bool inside = false;
+  while (!prefix.empty() && std::getline(hive, line)) {
+    if (ParseSectionName(line, &section)) {
+      inside = section.size() == key.size() && OpensKey(section, key);
+    } else if (inside && line.rfind("\"ACP\"=\"", 0) == 0) {
+      code_page = static_cast<unsigned>(std::strtoul(line.c_str() + 7, nullptr, 10));
+      break;
+    }
+  }
+  return code_page;
+}
+
+}  // namespace posix
 
 bool HklmKeyOpensForRead(const std::wstring& key) {
   const std::string prefix = posix::PrefixDirectory();

@@ -97,6 +97,18 @@ constexpr FoldRange kFoldRanges[] = {
     {0x0410, 0x042F, 32, false},    // Cyrillic capitals
 };
 
+// 0x80-0x9F, the only range where Windows-1252 differs from Latin-1. The
+// bytes the code page leaves undefined (0x81, 0x8D, 0x8F, 0x90, 0x9D) become
+// the control character of the same value, as Windows' own conversion does.
+const wchar_t kCp1252High[32] = {
+    0x20AC, 0x0081, 0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021,  // 80-87
+    0x02C6, 0x2030, 0x0160, 0x2039, 0x0152, 0x008D, 0x017D, 0x008F,  // 88-8F
+    0x0090, 0x2018, 0x2019, 0x201C, 0x201D, 0x2022, 0x2013, 0x2014,  // 90-97
+    0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0x009D, 0x017E, 0x0178,  // 98-9F
+};
+
+constexpr unsigned kCodePageUtf8 = 65001;
+
 }  // namespace
 
 std::string WideToUtf8(const std::wstring& wide) {
@@ -133,4 +145,28 @@ bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b) {
 }
 
 }  // namespace posix
+
+// The prefix's code page decides, as it would for a Windows program there.
+bool DecodeAnsiText(const std::string& bytes, std::wstring* text) {
+  if (text == nullptr) return false;
+  std::wstring decoded;
+  decoded.reserve(bytes.size());
+  if (posix::PrefixAnsiCodePage() == posix::kCodePageUtf8) {
+    // Strict: U+FFFD only where the bytes spell it.
+    for (size_t pos = 0; pos < bytes.size();) {
+      const size_t start = pos;
+      const char32_t c = posix::DecodeUtf8(bytes, &pos);
+      if (c == posix::kReplacement && bytes.compare(start, 3, "\xEF\xBF\xBD") != 0) return false;
+      decoded.push_back(static_cast<wchar_t>(c));
+    }
+  } else {
+    for (unsigned char byte : bytes) {
+      const bool high = byte >= 0x80 && byte <= 0x9F;
+      decoded.push_back(high ? posix::kCp1252High[byte - 0x80] : static_cast<wchar_t>(byte));
+    }
+  }
+  text->swap(decoded);
+  return true;
+}
+
 }  // namespace platform

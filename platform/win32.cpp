@@ -17,6 +17,7 @@
 #include <shlwapi.h>
 
 #include <algorithm>
+#include <climits>
 #include <mutex>
 #include <set>
 
@@ -148,6 +149,29 @@ bool RemoveFileSpec(std::wstring* path) {
   buffer.push_back(L'\0');
   if (!PathRemoveFileSpecW(&buffer[0])) return false;
   path->assign(buffer.c_str());
+  return true;
+}
+
+// ---- Text -------------------------------------------------------------------
+
+// Strict: a byte sequence the code page has no character for is refused,
+// never replaced, so a path is either the one written or none.
+bool DecodeAnsiText(const std::string& bytes, std::wstring* text) {
+  if (text == nullptr || bytes.size() > INT_MAX) return false;
+  if (bytes.empty()) {
+    text->clear();
+    return true;
+  }
+  const int size = static_cast<int>(bytes.size());
+  const int length =
+      MultiByteToWideChar(CP_ACP, MB_ERR_INVALID_CHARS, bytes.data(), size, nullptr, 0);
+  if (length <= 0) return false;
+  std::wstring decoded(static_cast<std::size_t>(length), L'\0');
+  if (MultiByteToWideChar(CP_ACP, MB_ERR_INVALID_CHARS, bytes.data(), size, &decoded[0], length) !=
+      length) {
+    return false;
+  }
+  text->swap(decoded);
   return true;
 }
 

@@ -49,6 +49,10 @@ const Row kRows[] = {
     {"H", true, 1, true, false, false,
      "settings not retired\tD:\\Jobs\\H\tregistered, but its settings are still at "
      "D:\\Jobs\\H\\[_KYR_HotFolder_]\\folder.cfg"},
+    // Not UTF-8, the machine's ANSI code page here: named by its bytes.
+    {"Caf\xE9", true, -1, true, false, false,
+     "path not decodable\tD:\\Jobs\\Caf\\xE9\tthe list's bytes for this path do not decode in "
+     "this machine's ANSI code page: hfmigrate cannot find the folder"},
 };
 constexpr int kAsListed = 5;  // the first rows: a run that went well
 
@@ -57,6 +61,7 @@ std::string Path(const Row& row) {
 }
 
 void Lay(const TempPrefix& prefix, const Row* rows, int count) {
+  UseUtf8AnsiCodePage(prefix);
   std::vector<LegacyFolder> list;
   std::vector<RunRecordEntry> record;
   for (const Row* row = rows; row != rows + count; ++row) {
@@ -94,8 +99,9 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
   std::string expected;
   for (const Row& row : kRows) expected += std::string(row.line) + "\n";
   expected +=
-      "9 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
-      " 1 settings not retired; not every folder with legacy settings is migrated as listed\n";
+      "10 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
+      " 1 settings not retired, 1 path not decodable; not every folder with legacy settings is"
+      " migrated as listed\n";
   CapturedRun run = Hfstore({"check"});
   EXPECT_EQ(run.status, 1) << run.err;
   EXPECT_EQ(run.out, expected);

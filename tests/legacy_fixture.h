@@ -39,6 +39,15 @@ inline void WriteLegacyList(const TempPrefix& prefix, const std::vector<LegacyFo
   prefix.WriteFile(LegacyListHostPath(prefix), LegacyListBytes(folders));
 }
 
+// Records UTF-8 as the prefix's ANSI code page, as Wine does for a Windows
+// switched to it: list paths that are not UTF-8 no longer decode.
+inline void UseUtf8AnsiCodePage(const TempPrefix& prefix) {
+  prefix.WriteFile(prefix.root() / "system.reg",
+                   "WINE REGISTRY Version 2\n\n"
+                   "[System\\\\CurrentControlSet\\\\Control\\\\Nls\\\\CodePage] 1700000000\n"
+                   "\"ACP\"=\"65001\"\n");
+}
+
 // Host path of D:\<relative> (relative with forward slashes).
 inline std::filesystem::path OnDriveD(const TempPrefix& prefix, const std::string& relative) {
   return prefix.Drive('d') / relative;
