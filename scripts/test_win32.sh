@@ -14,6 +14,8 @@
 #     is: the store records the running server's directory (the PDF filter's
 #     error path), so a stand-in not launched from there shows as a
 #     difference from the Linux run.
+#   - a list path that does not decode in the ANSI code page (Japanese,
+#     from the locale) keeps its place, and hfstore check names it.
 # Any difference or failure, a missing tool included, fails it.
 #
 # The Linux executables come from build/ (HF_LINUX_BIN names another place).
@@ -280,12 +282,47 @@ inspector_usage() {
   WINEPREFIX=$p wineserver -k 2>/dev/null || true
 }
 
+# A list path that does not decode in the machine's ANSI code page (here
+# Japanese, 932, which Wine takes from the locale: a lead byte before a space
+# is no character) keeps its place: the run migrates the other folder, and
+# hfstore check names it by its bytes and exits 1.
+undecodable_path() {
+  local p=$scratch/codepage status=0 list
+  copy_prefix "$p"
+  mkdir -p "$p/drive_d/Jobs/Plain/[_KYR_HotFolder_]"
+  echo '<HotFolder/>' >"$p/drive_d/Jobs/Plain/[_KYR_HotFolder_]/folder.cfg"
+  ln -sfn ../drive_d "$p/dosdevices/d:"
+  list="$p/drive_c/ProgramData/KYR/ZerOvurova/KYR ZerOvurova Preferences"
+  mkdir -p "$list"
+  perl -e 'print "KYR ZerOvurova Database\0\x01", "\0" x 15;
+           print "\0\0\x02\0", pack("a260", $_) for "D:\\Jobs\\Bad\x81 x", "D:\\Jobs\\Plain";' \
+    >"$list/KYR ZerOvurova DB"
+  place w "$p/$server_host_dir" hotfolder
+  place w "$p/$tool_host_dir" hfmigrate hfstore
+  # Through env: the host need not have the locale, Wine only reads its name.
+  local japanese=(env LC_ALL=ja_JP.UTF-8 wine)
+  start_wine_server "$p"
+  timed_run "$p" "${japanese[@]}" "$tool_dir\\hfmigrate.exe"
+  check_run "an undecodable list path under Wine" lt 600
+  WINEPREFIX=$p "${japanese[@]}" "$tool_dir\\hfstore.exe" check >"$scratch/codepage.check" ||
+    status=$?
+  [ "$status" -eq 1 ] || fail "an undecodable list path: hfstore check ended with $status, not 1"
+  printf '%s\t%s\t%s\n' "path not decodable" 'D:\Jobs\Bad\x81 x' \
+    "the list's bytes for this path do not decode in this machine's ANSI code page: hfmigrate cannot find the folder" \
+    "migrated" 'D:\Jobs\Plain' "enabled, as listed" >"$scratch/codepage.expected"
+  head -2 "$scratch/codepage.check" | diff -u "$scratch/codepage.expected" - >&2 ||
+    fail "an undecodable list path: the run or hfstore check did not keep its place"
+  echo "test_win32: an undecodable list path keeps its place and hfstore check names it"
+  WINEPREFIX=$p wineserver -k 2>/dev/null || true
+}
+
 generated=$scratch/generated
 "$linux_bin/hfbench_generate" "$generated" 300 7 >/dev/null
 
 platform_contract
 inspector_usage
 startup_running
+undecodable_path
 compare demo examples/legacy absent
 compare generated "$generated" running
 echo "test_win32: all passed"
