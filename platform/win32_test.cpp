@@ -7,6 +7,7 @@
 
 #include <windows.h>
 
+#include <aclapi.h>
 #include <sddl.h>
 
 #include <gtest/gtest.h>
@@ -146,6 +147,85 @@ TEST(Win32, LongPathsNameTheSameFileAtAnyLength) {
   for (std::wstring dir = retired; dir.size() > root.size(); dir.resize(dir.rfind(L'\\')))
     RemoveDirectoryW(platform::ToLongHostPath(dir).c_str());
   RemoveDirectoryW(root.c_str());
+}
+
+// The descriptor Wine reports for a directory, as text.
+std::wstring Descriptor(const std::wstring& dir) {
+  PSECURITY_DESCRIPTOR descriptor = nullptr;
+  LPWSTR text = nullptr;
+  const SECURITY_INFORMATION what = OWNER_SECURITY_INFORMATION | DACL_SECURITY_INFORMATION;
+  if (GetNamedSecurityInfoW(dir.c_str(), SE_FILE_OBJECT, what, nullptr, nullptr, nullptr, nullptr,
+                            &descriptor) != ERROR_SUCCESS ||
+      !ConvertSecurityDescriptorToStringSecurityDescriptorW(descriptor, SDDL_REVISION_1, what,
+                                                            &text, nullptr)) {
+    return L"?";
+  }
+  std::wstring result = text;
+  LocalFree(text);
+  LocalFree(descriptor);
+  return result;
+}
+
+// The folder an elevated run keeps its files in, and the run record's files.
+// Wine maps a descriptor given at creation onto the host's file mode and
+// hands back what that mode grants, so the made folder is compared with one
+// made with the descriptor written out here and with one that inherits; "P"
+// and the Users entry themselves it cannot show. Links come from the host
+// (Wine's CreateSymbolicLinkW makes none): test_win32.sh plants them in
+// HF_LINK_DIR. Wine shows a host link to a directory as a reparse point but
+// one to a file as the file, and names the running user as every file's
+// owner, so neither a refused link of another user nor a record refused for
+// being a link shows here: the Linux link test plants those.
+TEST(Win32, OwnFolderAndRecordFilesNeverThroughALink) {
+  wchar_t temp[MAX_PATH] = {};
+  ASSERT_GT(GetTempPathW(MAX_PATH, temp), 0u);
+  const std::wstring root = std::wstring(temp) + L"hf-own-" + std::to_wstring(GetTickCount64());
+  const std::wstring folder = root + L"\\KYR\\Dirorodiv";
+  const platform::TrustedFolder made = platform::OpenTrustedFolder(folder, true);
+  EXPECT_EQ(made.trust, platform::FolderTrust::kTrusted);
+  EXPECT_EQ(made.path, folder);
+  PSECURITY_DESCRIPTOR written = nullptr;
+  ASSERT_TRUE(ConvertStringSecurityDescriptorToSecurityDescriptorW(
+      L"D:P(A;OICI;FA;;;BA)(A;OICI;FA;;;SY)(A;OICI;0x1200a9;;;BU)", SDDL_REVISION_1, &written,
+      nullptr));
+  SECURITY_ATTRIBUTES attributes = {sizeof(attributes), written, FALSE};
+  ASSERT_TRUE(CreateDirectoryW((root + L"\\reference").c_str(), &attributes));
+  LocalFree(written);
+  ASSERT_TRUE(CreateDirectoryW((root + L"\\inherits").c_str(), nullptr));
+  for (const std::wstring& dir : {root, root + L"\\KYR", folder})
+    EXPECT_EQ(Descriptor(dir), Descriptor(root + L"\\reference"));
+  EXPECT_NE(Descriptor(root + L"\\inherits"), Descriptor(root + L"\\reference"));
+  EXPECT_EQ(platform::OpenTrustedFolder(root + L"\\none\\x", false).trust,
+            platform::FolderTrust::kMissing);
+  for (const wchar_t* dir : {L"\\KYR\\Dirorodiv", L"\\KYR", L"\\inherits", L"\\reference", L""})
+    RemoveDirectoryW((root + dir).c_str());
+
+  // A link of the running user's own on the way is followed. The record's
+  // temporary file is made new: where a link stands in its place that the
+  // system cannot remove (Wine's DeleteFileW cannot remove a dangling host
+  // link; Windows' removes the link itself), nothing is written and nothing
+  // made where it points. A link under the record's name is replaced, and
+  // what it named stays as it was.
+  const std::wstring links = Environment("HF_LINK_DIR");
+  ASSERT_FALSE(links.empty()) << "HF_LINK_DIR must name the planted links";
+  EXPECT_TRUE(platform::IsLink(links + L"\\dirlink") && !platform::IsLink(links + L"\\dir"));
+  EXPECT_EQ(platform::OpenTrustedFolder(links + L"\\dirlink", false).trust,
+            platform::FolderTrust::kTrusted);
+  EXPECT_EQ(platform::CheckTrustedHostFolder(links + L"\\target\\x").trust,
+            platform::FolderTrust::kNotADirectory);
+  EXPECT_FALSE(platform::ReplaceFileDurably(links + L"\\stale", "record"));
+  EXPECT_FALSE(platform::FileExists(links + L"\\nowhere") ||
+               platform::FileExists(links + L"\\stale"));
+  std::string bytes;
+  EXPECT_TRUE(platform::ReplaceFileDurably(links + L"\\run", "record"));
+  EXPECT_EQ(platform::ReadRegularFile(links + L"\\target", 100, &bytes), platform::FileRead::kRead);
+  EXPECT_EQ(bytes, "outside");
+  EXPECT_EQ(platform::ReadRegularFile(links + L"\\run", 100, &bytes), platform::FileRead::kRead);
+  EXPECT_EQ(bytes, "record");
+  EXPECT_EQ(platform::ReadRegularFile(links + L"\\dir", 100, &bytes),
+            platform::FileRead::kNotAFile);
+  EXPECT_EQ(platform::ReadRegularFile(links + L"\\none", 100, &bytes),
+            platform::FileRead::kMissing);
 }
 
 }  // namespace

@@ -255,6 +255,15 @@ compare() {
 platform_contract() {
   local p=$scratch/platform
   copy_prefix "$p"
+  # Links the record's files must not follow, made on the host: Wine makes
+  # none of its own.
+  local links=$p/drive_c/hf-links
+  mkdir -p "$links/dir"
+  printf outside >"$links/target"
+  ln -s dir "$links/dirlink"
+  ln -s nowhere "$links/stale.new"
+  ln -s target "$links/run"
+  HF_LINK_DIR='C:\hf-links' \
   HF_BIN_DIR="$(WINEPREFIX=$p winepath -w "$win_bin" 2>/dev/null)" WINEPREFIX=$p \
     timeout 300 wine build-win64/tests/platform_test.exe
 }
