@@ -12,6 +12,7 @@
 #include "convert/settings_dir.h"
 #include "engine/migrator.h"
 #include "engine/run_record.h"
+#include "store/store_file.h"
 #include "store/store_reader.h"
 
 namespace {
@@ -173,10 +174,14 @@ int RunCheck(const platform::HostPath& store_file, bool json) {
     std::cerr << "hfstore: no legacy hot-folder list to check (missing, unreadable or empty)\n";
     return 1;
   }
-  // A store that is not there holds no folder: nothing was migrated.
+  // A store that is not there holds no folder: nothing was migrated. One
+  // refused (behind another user's link, or a link itself) is said so.
   std::vector<StoredHotFolder> stored;
+  const db::StoreFile placed = db::CheckStoreFile(store_file);
   std::error_code ec;
-  if (std::filesystem::exists(std::filesystem::path(store_file), ec)) {
+  if (!placed.missing &&
+      (placed.path.empty() ||
+       std::filesystem::exists(std::filesystem::symlink_status(placed.path, ec)))) {
     wxString error;
     if (!ReadStore(store_file, &stored, &error)) {
       std::cerr << "hfstore: " << Field(error) << '\n';

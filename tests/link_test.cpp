@@ -73,10 +73,13 @@ TEST(Links, NothingWrittenThroughAnotherUsersLink) {
     EXPECT_EQ(Snapshot(prefix.Drive('d')) == retired, row.migrated);
     EXPECT_EQ(Snapshot(prefix.Drive('d')) == drive_before, !row.migrated);
     EXPECT_EQ(Snapshot(outside) == outside_before, row.owner != 0);
-    const CapturedRun list = RunCaptured(BinDir() + "/hfstore", {"list"});
-    EXPECT_EQ(list.status, row.refusal ? 1 : 0) << list.err;
-    EXPECT_EQ(list.out, row.migrated ? "enabled\tA\tD:\\Jobs\\A\tPDF > PS > TIFF > VDP\n" : "");
-    EXPECT_NE(list.err.find(row.refusal ? row.refusal : ""), std::string::npos) << list.err;
+    for (const char* command : {"list", "check"}) {
+      const CapturedRun run = RunCaptured(BinDir() + "/hfstore", {command});
+      EXPECT_EQ(run.status, row.refusal ? 1 : 0) << command << run.err;
+      EXPECT_NE(run.err.find(row.refusal ? row.refusal : ""), std::string::npos) << run.err;
+    }
+    EXPECT_EQ(RunCaptured(BinDir() + "/hfstore", {"list"}).out,
+              row.migrated ? "enabled\tA\tD:\\Jobs\\A\tPDF > PS > TIFF > VDP\n" : "");
   }
 }
 
