@@ -11,7 +11,9 @@
 # run down, so the two alternate and the fastest run of each counts, with
 # the largest peak memory seen in any run. It prints
 # wall time, time per folder, peak memory and the ratio to the floor, then
-# checks the targets.
+# checks the targets. Each hfmigrate run holds the lock that the tests
+# which start or stop the server stand-in hold, so that no other build's
+# test stops the benchmark's server (or the benchmark theirs).
 #
 #   [BENCH_RUNS=N] scripts/bench.sh [COUNT...]
 set -euo pipefail
@@ -37,6 +39,8 @@ cleanup() {
 }
 trap cleanup EXIT
 
+server_lock=/tmp/hfmigrate-hotfolder-tests.lock
+
 store_of() { echo "$1/drive_c/ProgramData/KYR/Dirorodiv/HotFolders.db"; }
 
 # Starts the server stand-in in prefix $1 and returns once it holds its
@@ -61,7 +65,10 @@ stop_server() {
 # Runs hfmigrate over prefix $1; fails when the server was gone before the
 # run ended (the start-up wait would then be in the time).
 measure_tool() {
-  local prefix=$1 out=$2
+  local prefix=$1 out=$2 lock
+  exec {lock}>>"$server_lock"
+  chmod 0666 "$server_lock" 2>/dev/null || true
+  flock "$lock"
   start_server "$prefix"
   sync
   WINEPREFIX="$prefix" "$bin/hfbench_measure" "$out" "$bin/hfmigrate"
@@ -76,6 +83,7 @@ measure_tool() {
     exit 1
   fi
   stop_server
+  exec {lock}>&-
 }
 
 # The fastest wall time of the runs in file $1 ("wall rss status" lines),
