@@ -12,8 +12,16 @@
 // a narrow text (wxString::FromAscii too) runs the C library's multibyte
 // conversion instead, and for the hundred-odd table texts a folder uses that
 // cost more than the rest of its conversion.
+// Short texts are widened on the stack, so the result is the only
+// allocation.
 inline wxString AsciiText(const char* ascii) {
-  return wxString(std::wstring(ascii, ascii + std::strlen(ascii)));
+  const std::size_t length = std::strlen(ascii);
+  wchar_t wide[64];
+  if (length > sizeof(wide) / sizeof(wide[0])) {
+    return wxString(std::wstring(ascii, ascii + length));
+  }
+  for (std::size_t i = 0; i < length; ++i) wide[i] = ascii[i];
+  return wxString(wide, length);
 }
 
 #endif  // HF_CONVERT_ASCII_TEXT_H_

@@ -1,6 +1,8 @@
 #include "convert/filter_chain.h"
 
 #include <cstddef>
+#include <iterator>
+#include <vector>
 
 #include "convert/ascii_text.h"
 #include "convert/server_lookup.h"
@@ -90,19 +92,41 @@ const DefaultFilter kDefaultChain[] = {
     {&CHFMigrator::m_Vdp, nullptr, 0, "KYR.VDP.1", "VDP", false},
 };
 
-void Append(FilterChain* chain, const SettingsMap& settings, const char* identifier,
-            const char* display_name) {
+void Append(FilterChain* chain, wxXmlNode* root, const SettingsMap& settings,
+            const char* identifier, const char* display_name) {
   wxString id = AsciiText(identifier);
-  chain->root->AddChild(BuildFilterElement(settings, id));
+  root->AddChild(BuildFilterElement(settings, id));
   chain->entries.push_back({AsciiText(display_name), id});
 }
 
-void WriteFixedValues(CHFMigrator& engine, const DefaultFilter& filter) {
-  SettingsMap& settings = engine.*filter.settings;
-  for (std::size_t i = 0; i < filter.fixed_count; ++i) {
-    const FixedValue& fixed = filter.fixed_values[i];
-    settings.GetOrInsert(AsciiText(fixed.key)) =
-        fixed.value ? AsciiText(fixed.value) : CachedServerDirectory(engine.m_ServerDirectory);
+// The fixed values as wide texts, made once per run: every folder of the
+// default chain writes all of them.
+struct WideFixedValue {
+  wxString key;
+  wxString value;
+  bool server_directory;
+};
+
+const std::vector<WideFixedValue>& WideFixedValues(std::size_t filter) {
+  static const std::vector<std::vector<WideFixedValue>> tables = [] {
+    std::vector<std::vector<WideFixedValue>> wide(std::size(kDefaultChain));
+    for (std::size_t f = 0; f < std::size(kDefaultChain); ++f) {
+      for (std::size_t i = 0; i < kDefaultChain[f].fixed_count; ++i) {
+        const FixedValue& fixed = kDefaultChain[f].fixed_values[i];
+        wide[f].push_back({AsciiText(fixed.key), fixed.value ? AsciiText(fixed.value) : wxString(),
+                           fixed.value == nullptr});
+      }
+    }
+    return wide;
+  }();
+  return tables[filter];
+}
+
+void WriteFixedValues(CHFMigrator& engine, std::size_t filter) {
+  SettingsMap& settings = engine.*kDefaultChain[filter].settings;
+  for (const WideFixedValue& fixed : WideFixedValues(filter)) {
+    settings.GetOrInsert(fixed.key) =
+        fixed.server_directory ? CachedServerDirectory(engine.m_ServerDirectory) : fixed.value;
   }
 }
 
@@ -125,22 +149,24 @@ wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& ident
   return filter;
 }
 
-FilterChain BuildFilterChain(CHFMigrator& engine) {
+FilterChain BuildFilterChain(CHFMigrator& engine, wxXmlNode* root) {
   FilterChain chain;
-  chain.root = std::make_unique<wxXmlNode>(wxXML_ELEMENT_NODE, "FilterSetting");
+  root->SetType(wxXML_ELEMENT_NODE);
+  root->SetName(L"FilterSetting");
   bool default_chain = true;
   bool default_tiff = true;
   for (const LegacyFilter& filter : kLegacyFilters) {
     if (engine.m_FilterEnable.GetOrInsert(filter.key) != wxS("1")) continue;
-    Append(&chain, engine.*filter.converted, filter.identifier, filter.display_name);
+    Append(&chain, root, engine.*filter.converted, filter.identifier, filter.display_name);
     if (filter.default_chain == DefaultChain::kReplaced) default_chain = false;
     if (filter.default_chain == DefaultChain::kKeptWithoutTiff) default_tiff = false;
   }
   if (!default_chain) return chain;
-  for (const DefaultFilter& filter : kDefaultChain) {
+  for (std::size_t i = 0; i < std::size(kDefaultChain); ++i) {
+    const DefaultFilter& filter = kDefaultChain[i];
     if (filter.skipped_with_legacy_tiff && !default_tiff) continue;
-    WriteFixedValues(engine, filter);
-    Append(&chain, engine.*filter.settings, filter.identifier, filter.display_name);
+    WriteFixedValues(engine, i);
+    Append(&chain, root, engine.*filter.settings, filter.identifier, filter.display_name);
   }
   return chain;
 }

@@ -5,16 +5,14 @@
 
 #include <wx/xml/xml.h>
 
-#include <memory>
 #include <vector>
 
 #include "engine/migrator.h"
 #include "store/records.h"
 
-// The list the store shows and, in step with it, the "FilterSetting" tree
-// whose "Filter" children carry each filter's settings.
+// The list the store shows, in step with the "Filter" children of the
+// "FilterSetting" tree, which carry each filter's settings.
 struct FilterChain {
-  std::unique_ptr<wxXmlNode> root;
   std::vector<db::FilterEntry> entries;
 };
 
@@ -23,9 +21,11 @@ struct FilterChain {
 // the value). The caller owns the result.
 wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier);
 
-// Reads the filter-enable map and the filters' settings maps. The default
-// chain writes its fixed values into the engine's maps first, where they
-// stay for later folders.
-FilterChain BuildFilterChain(CHFMigrator& engine);
+// Reads the filter-enable map and the filters' settings maps, and makes
+// `root`, a node without children, the "FilterSetting" element of the chain.
+// The tree is built where the store record holds it, so that no folder pays
+// for a copy of it. The default chain writes its fixed values into the
+// engine's maps first, where they stay for later folders.
+FilterChain BuildFilterChain(CHFMigrator& engine, wxXmlNode* root);
 
 #endif  // HF_CONVERT_FILTER_CHAIN_H_

@@ -76,11 +76,10 @@ bool CHFMigrator::RegisterHotFolder() {
   // Every record is complete before the settings directory moves, so the
   // time in which the folder is neither legacy nor registered is only the
   // store's own call.
-  FilterChain chain = BuildFilterChain(*this);
+  db::FilterConfiguration filter;
+  FilterChain chain = BuildFilterChain(*this, &filter);
   FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert(L"HFFolderPath"));
   db::Setting setting = MakeSetting(*this, paths, chain);
-  db::FilterConfiguration filter;
-  filter = *chain.root;
   db::FolderConfiguration folder;
   folder.FolderPath = m_FolderSettings.GetOrInsert(L"HFFolderPath");
   folder.WorkFolder = paths.work;
