@@ -56,17 +56,22 @@ std::string CreateSchemaSql() {
   for (const FolderField& field : kFolderFields)
     sql += std::string(", ") + field.name + " TEXT NOT NULL";
   sql += ");\n";
+  // Stored in the order of their key, without a rowid: each row goes into
+  // one b-tree instead of a table and an index beside it, so a folder's
+  // commit writes fewer pages.
   sql +=
       "CREATE TABLE filter_entry(hot_folder INTEGER NOT NULL, position INTEGER NOT NULL,"
-      " DisplayName TEXT NOT NULL, Identifier TEXT NOT NULL, PRIMARY KEY(hot_folder, position));\n"
+      " DisplayName TEXT NOT NULL, Identifier TEXT NOT NULL, PRIMARY KEY(hot_folder, position))"
+      " WITHOUT ROWID;\n"
       "CREATE TABLE job_setting(hot_folder INTEGER NOT NULL, position INTEGER NOT NULL,"
       " key TEXT NOT NULL, Name TEXT NOT NULL, Value TEXT NOT NULL, Extra TEXT NOT NULL,"
-      " PRIMARY KEY(hot_folder, position));\n"
+      " PRIMARY KEY(hot_folder, position)) WITHOUT ROWID;\n"
       "CREATE TABLE impose_setting(hot_folder INTEGER NOT NULL, position INTEGER NOT NULL,"
       " key TEXT NOT NULL, Name TEXT NOT NULL, Value TEXT NOT NULL,"
-      " PRIMARY KEY(hot_folder, position));\n"
+      " PRIMARY KEY(hot_folder, position)) WITHOUT ROWID;\n"
       "CREATE TABLE preflight_entry(hot_folder INTEGER NOT NULL, position INTEGER NOT NULL,"
-      " First TEXT NOT NULL, Second TEXT NOT NULL, PRIMARY KEY(hot_folder, position));\n";
+      " First TEXT NOT NULL, Second TEXT NOT NULL, PRIMARY KEY(hot_folder, position))"
+      " WITHOUT ROWID;\n";
   sql += "PRAGMA user_version = " + std::to_string(kSchemaVersion) + ";\n";
   return sql;
 }

@@ -12,9 +12,18 @@
 
 namespace db {
 
-// PRAGMA user_version of a database laid out as below. A database of any
+// PRAGMA user_version of a database laid out as below. Version 1 has the
+// same tables and columns, with the four tables keyed by (hot_folder,
+// position) kept beside a separate index of that key: it is read and
+// written as it is, and a new database gets version 2. A database of any
 // other version is not ours to read or change.
-constexpr int kSchemaVersion = 1;
+constexpr int kSchemaVersion = 2;
+constexpr int kFirstSchemaVersion = 1;
+
+// Whether a database of that version is ours.
+constexpr bool IsOurSchemaVersion(long long version) {
+  return version >= kFirstSchemaVersion && version <= kSchemaVersion;
+}
 
 // The statements that create the tables of an empty database.
 std::string CreateSchemaSql();

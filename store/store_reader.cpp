@@ -149,11 +149,11 @@ bool ReadDatabase(const std::string& name, int flags, const wxString& shown,
       return true;
     }
   }
-  if (version != db::kSchemaVersion) {
+  if (!db::IsOurSchemaVersion(version)) {
     *error = version < 0 ? "cannot read store " + shown + ": " +
                                wxString::FromUTF8(sqlite3_errmsg(db.get()))
-                         : wxString::Format("%s is not a hot-folder store of version %d", shown,
-                                            db::kSchemaVersion);
+                         : wxString::Format("%s is not a hot-folder store of version %d to %d",
+                                            shown, db::kFirstSchemaVersion, db::kSchemaVersion);
     return false;
   }
   // One read transaction, so a writer committing meanwhile cannot show

@@ -9,6 +9,7 @@
 #include <algorithm>
 
 #include "store/record_fields.h"
+#include "store/schema.h"
 #include "store/store.h"
 #include "tests/run_program.h"
 #include "tests/temp_prefix.h"
@@ -113,6 +114,18 @@ void WriteSqlite(const fs::path& file, const char* sql) {
   ASSERT_EQ(sqlite3_open(file.c_str(), &db), SQLITE_OK);
   ASSERT_EQ(sqlite3_exec(db, sql, nullptr, nullptr, nullptr), SQLITE_OK);
   sqlite3_close(db);
+}
+
+// A store an earlier build wrote (version 1: the keyed tables with a rowid
+// and an index beside each) is read and written as it stands.
+TEST(Store, FirstLayoutIsReadAndWrittenAsItStands) {
+  TempPrefix prefix;
+  std::string sql = db::CreateSchemaSql();
+  for (size_t at; (at = sql.find(" WITHOUT ROWID")) != std::string::npos;) sql.erase(at, 14);
+  WriteSqlite(StoreFile(prefix), (sql + "PRAGMA user_version = 1;").c_str());
+  ASSERT_NE(Folder("D:\\Jobs\\A").Create(), 0);
+  EXPECT_TRUE(Disable("D:\\Jobs\\A"));
+  EXPECT_EQ(Hfstore({"list"}).out, "disabled\t\tD:\\Jobs\\A\t\n");
 }
 
 TEST(Store, RefusedFileStaysUnchanged) {

@@ -55,14 +55,14 @@ bool QuickCheckPasses(sqlite3* db) {
   return statement.ColumnText(0) == "ok" && !statement.Step() && !statement.Failed();
 }
 
-// 0 for an empty database, kSchemaVersion for ours, -1 for anything else.
+// 0 for an empty database, its version for ours, -1 for anything else.
 int SchemaState(sqlite3* db) {
   std::int64_t version = 0;
   std::int64_t objects = 0;
   if (!QueryInt(db, "PRAGMA user_version", &version)) return -1;
   if (!QueryInt(db, "SELECT count(*) FROM sqlite_master", &objects)) return -1;
   if (version == 0 && objects == 0) return 0;
-  return version == kSchemaVersion ? kSchemaVersion : -1;
+  return IsOurSchemaVersion(version) ? static_cast<int>(version) : -1;
 }
 
 std::string Placeholders(std::size_t count) {
@@ -170,14 +170,14 @@ bool StoreWriter::Open(const StoreLocation& location, bool create) {
   // Only reads until the file has shown it is an empty database or ours:
   // the journal mode and the schema are written to nothing else.
   int schema = SchemaState(db);
-  if (schema < 0 || (schema == kSchemaVersion && !QuickCheckPasses(db))) return false;
+  if (schema < 0 || (schema > 0 && !QuickCheckPasses(db))) return false;
   if (!Exec(db, "PRAGMA journal_mode = WAL; PRAGMA synchronous = FULL;")) return false;
   if (schema == 0) {
     // Another process may be creating the same store; whoever comes second
     // finds the schema in place.
     if (!Exec(db, "BEGIN IMMEDIATE")) return false;
     schema = SchemaState(db);
-    bool created = schema == kSchemaVersion || (schema == 0 && Exec(db, CreateSchemaSql().c_str()));
+    bool created = schema > 0 || (schema == 0 && Exec(db, CreateSchemaSql().c_str()));
     if (!created || !Exec(db, "COMMIT")) {
       Exec(db, "ROLLBACK");
       return false;
