@@ -9,6 +9,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <string_view>
+
 #include "platform/platform.h"
 #include "platform/posix_internal.h"
 
@@ -24,16 +26,16 @@ bool IsAsciiLetter(wchar_t c) {
 // empty components vanish; ".." removes the previous component but never
 // one of the first `floor` (the share's server and name). A ".." at the root
 // is dropped, as Windows does, so no path leaves its drive.
-void AddComponents(const std::wstring& rest, size_t floor, std::vector<std::wstring>* parts) {
+void AddComponents(std::wstring_view rest, size_t floor, std::vector<std::wstring>* parts) {
   size_t start = 0;
   while (start <= rest.size()) {
     size_t end = rest.find(L'\\', start);
-    if (end == std::wstring::npos) end = rest.size();
-    const std::wstring part = rest.substr(start, end - start);
+    if (end == std::wstring_view::npos) end = rest.size();
+    const std::wstring_view part = rest.substr(start, end - start);
     start = end + 1;
     if (part.empty() || part == L".") continue;
     if (part != L"..") {
-      parts->push_back(part);
+      parts->emplace_back(part);
     } else if (parts->size() > floor) {
       parts->pop_back();
     }
@@ -69,7 +71,10 @@ std::string MatchEntry(const std::string& dir, const std::string& name) {
 size_t ExactPrefix(const std::string& dir, const std::vector<std::string>& parts) {
   if (parts.empty()) return 0;
   std::string path = dir;
-  for (const std::string& part : parts) path += "/" + part;
+  for (const std::string& part : parts) {
+    path += '/';
+    path += part;
+  }
   struct stat st;
   if (lstat(path.c_str(), &st) == 0) return parts.size();
   if (parts.size() < 2) return 0;
@@ -84,12 +89,16 @@ void ResolveParts(const std::vector<std::wstring>& windows_parts, MappedPath* ma
   std::vector<std::string>& parts = mapped->parts;
   for (const std::wstring& windows_part : windows_parts) parts.push_back(WideToUtf8(windows_part));
   const size_t exact = ExactPrefix(dir, parts);
-  for (size_t i = 0; i < exact; ++i) dir += "/" + parts[i];
+  for (size_t i = 0; i < exact; ++i) {
+    dir += '/';
+    dir += parts[i];
+  }
   for (size_t i = exact; i < parts.size(); ++i) {
     const std::string match = MatchEntry(dir, parts[i]);
     if (match.empty()) break;  // the rest does not exist; it keeps its case
     parts[i] = match;
-    dir += "/" + match;
+    dir += '/';
+    dir += match;
   }
 }
 
@@ -147,7 +156,10 @@ std::wstring CurrentWindowsDirectory() {
 
 std::string MappedPath::Join() const {
   std::string path = root;
-  for (const std::string& part : parts) path += (path.empty() ? "" : "/") + part;
+  for (const std::string& part : parts) {
+    if (!path.empty()) path += '/';
+    path += part;
+  }
   return path.empty() ? "." : path;
 }
 
@@ -186,11 +198,13 @@ MappedPath MapWindowsPath(const std::wstring& windows_path) {
       if (name.empty() || name == L"." || name == L"..") return mapped;
     }
     parts = {server, share};
-    if (share_end != std::wstring::npos) AddComponents(path.substr(share_end + 1), 2, &parts);
+    if (share_end != std::wstring::npos) {
+      AddComponents(std::wstring_view(path).substr(share_end + 1), 2, &parts);
+    }
     mapped.root = prefix + "/dosdevices/unc";
   } else if (path.size() >= 2 && IsAsciiLetter(path[0]) && path[1] == L':') {
     // "X:rest" has no current directory of its own here: it counts from X:\.
-    AddComponents(path.substr(2), 0, &parts);
+    AddComponents(std::wstring_view(path).substr(2), 0, &parts);
     mapped.root = prefix + "/dosdevices/" + static_cast<char>(FoldCase(path[0])) + ":";
   } else if (path[0] == L'\\') {
     // Rooted on "the current drive": there is none to take it from.
