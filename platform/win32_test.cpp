@@ -50,7 +50,7 @@ TEST(Win32, AnswersAsWindowsDoesAndLeavesNoHandle) {
       << "HF_BIN_DIR must name the directory of hotfolder.exe";
   CloseHandle(server.hThread);
   // Holding its mutex, it is past the start-up that lists its modules.
-  Eventually([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); });
+  WaitFor([] { return platform::NamedMutexExists(L"KYR Dirorodiv - Server"); });
 
   // Each once to let the system load what it keeps for good, then twice more.
   std::wstring base_name, file_name;

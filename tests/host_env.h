@@ -12,13 +12,6 @@
 
 #include "platform/platform.h"
 
-// Separates the directories of the executable search path.
-#ifdef _WIN32
-inline const platform::HostPath kSearchPathSeparator = L";";
-#else
-inline const platform::HostPath kSearchPathSeparator = ":";
-#endif
-
 // A variable of the environment; empty when unset.
 inline platform::HostPath Environment(const char* name) {
 #ifdef _WIN32
@@ -29,14 +22,6 @@ inline platform::HostPath Environment(const char* name) {
   return value ? value : platform::HostPath();
 }
 
-inline void SetEnvironment(const char* name, const platform::HostPath& value) {
-#ifdef _WIN32
-  _wputenv_s(std::wstring(name, name + std::strlen(name)).c_str(), value.c_str());
-#else
-  setenv(name, value.c_str(), 1);
-#endif
-}
-
 // Polls `condition` every 20 ms for up to `timeout_ms`.
 template <typename Condition>
 bool WaitFor(Condition condition, int timeout_ms = 10000) {
@@ -45,12 +30,6 @@ bool WaitFor(Condition condition, int timeout_ms = 10000) {
     std::this_thread::sleep_for(std::chrono::milliseconds(20));
   }
   return condition();
-}
-
-// The platform tests' name for the same wait.
-template <typename Condition>
-bool Eventually(Condition condition) {
-  return WaitFor(condition);
 }
 
 #endif  // HF_TESTS_HOST_ENV_H_
