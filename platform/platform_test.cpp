@@ -19,6 +19,7 @@
 #ifndef _WIN32
 // POSIX host only: processes, the prefix, extended attributes.
 #include <sys/xattr.h>
+#include <unistd.h>
 
 #include "tests/run_program.h"
 #include "tests/temp_prefix.h"
@@ -242,6 +243,42 @@ TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
 // POSIX host: processes listed in ascending id order. kill() reads 0 as "my
 // process group"; such ids are refused. That check runs in a child with a
 // group of its own, so a failure ends only that.
+// A folder is reached only through links of root's or the running user's,
+// those inside a link's target included, and named with none left in it.
+TEST(PrefixTest, TrustedFoldersFollowOnlyTrustedLinks) {
+  if (geteuid() != 0) GTEST_SKIP() << "planting another user's link needs root";
+  TempPrefix prefix;
+  const fs::path d = prefix.Drive('d');
+  fs::create_directories(d / "real/sub");
+  const std::tuple<const char*, const char*, uid_t> links[] = {{"foreign", "real", 65534},
+                                                               {"own", "real", 0},
+                                                               {"via", "foreign/sub", 0},
+                                                               {"up", "../drive_d/own", 0},
+                                                               {"file", "real/file", 0}};
+  prefix.WriteFile(d / "real/file", "");
+  for (const auto& [name, target, owner] : links) {
+    fs::create_symlink(target, d / name);
+    ASSERT_EQ(lchown((d / name).c_str(), owner, owner), 0);
+  }
+  using T = platform::FolderTrust;
+  const std::tuple<const wchar_t*, bool, T, std::string> cases[] = {
+      {L"D:\\own\\sub", false, T::kTrusted, "real/sub"},
+      {L"D:\\up\\sub\\new\\er", true, T::kTrusted, "real/sub/new/er"},
+      {L"D:\\foreign\\sub", false, T::kForeignLink, "foreign"},
+      {L"D:\\via", true, T::kForeignLink, "foreign"},
+      {L"D:\\own\\none", false, T::kMissing, "real/none"},
+      {L"D:\\file\\x", true, T::kNotADirectory, "real/file"},
+      {L"Q:\\x", true, T::kMissing, "../dosdevices/q:"},  // a drive is never made
+  };
+  const std::string drive = fs::canonical(d).string() + "/";
+  for (const auto& [path, create, trust, where] : cases) {
+    const platform::TrustedFolder folder = platform::OpenTrustedFolder(path, create);
+    EXPECT_EQ(folder.trust, trust) << fs::path(path);
+    EXPECT_EQ(folder.path, fs::path(drive + where).lexically_normal().string()) << fs::path(path);
+  }
+  EXPECT_FALSE(fs::exists(d / "real/none") || fs::exists(prefix.root() / "dosdevices/q:"));
+}
+
 TEST(ProcessTest, ListsByIdAndRefusesProcessGroupIds) {
   std::vector<platform::ProcessId> ids;
   ASSERT_TRUE(platform::EnumerateProcesses(&ids));

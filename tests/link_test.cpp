@@ -53,14 +53,13 @@ TEST(Links, NothingWrittenThroughAnotherUsersLink) {
     WriteLegacyList(prefix, {{"D:\\Jobs\\A", 2}});
     WriteFolderConfig(prefix, "Jobs/A", "<r/>");
     prefix.WriteFile(OnDriveD(prefix, "Jobs/X/[_KYR_HotFolder_Old]/folder.cfg"), "<r/>");
+    fs::create_directories(outside);
     if (row.directory) {
       fs::create_directories(kyr / "Dirorodiv");
-      fs::create_directories(outside);
       fs::rename(at, target);
     } else if (row.target_exists) {
       prefix.WriteFile(target, EncodeRunRecord({{"D:\\Jobs\\X", true}}));
     }
-    fs::create_directories(outside);
     fs::create_directories(at.parent_path());
     fs::create_symlink(target, at);
     ASSERT_EQ(lchown(at.c_str(), row.owner, row.owner), 0);
