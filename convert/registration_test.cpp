@@ -3,6 +3,7 @@
 // end by the sample installation's reviewed dump (tests/migration_test.cpp).
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -74,27 +75,31 @@ TEST(ResolveServerName, DispatchAndShortName) {
 // system, or left in place when the retired name is taken; put back with
 // the attributes it had when the store refuses the folder (a damaged store,
 // a path already registered, which stays enabled though listed disabled).
-// The PDF filter's error folder is the running server's directory, its
-// module path cut to 259 characters first as Windows reads it.
+// A busy directory is tried again until it is free, but only a bounded
+// number of times. The PDF filter's error folder is the running server's
+// directory, its module path cut to 259 characters first as Windows reads
+// it.
 TEST(Registration, RetiringAndRefusal) {
   enum Store { kGood, kDamaged, kRegistered };
   const struct {
     Store store;
     bool taken;
     std::uint32_t before, after;
+    int busy;            // moves refused as busy before the directory is free
     std::string server;  // where a server runs on D:, "" for none
   } cases[] = {
-      {kGood, false, kRo | kSys | kHid | kAttributeArchive, kHid | kAttributeArchive, ""},
-      {kGood, true, kRo | kHid, kHid, ""},
-      {kDamaged, false, kRo | kSys, kRo | kSys, ""},
-      {kRegistered, false, kRo | kHid, kRo | kHid, ""},
-      {kGood, false, kRo, 0, std::string(100, 'L') + "/" + std::string(200, 'M')},
+      {kGood, false, kRo | kSys | kHid | kAttributeArchive, kHid | kAttributeArchive, 0, ""},
+      {kGood, true, kRo | kHid, kHid, 0, ""},
+      {kDamaged, false, kRo | kSys, kRo | kSys, 0, ""},
+      {kRegistered, false, kRo | kHid, kRo | kHid, 0, ""},
+      {kGood, false, kRo, 0, 5, std::string(100, 'L') + "/" + std::string(200, 'M')},
+      {kGood, false, kRo, 0, 1000, ""},  // never free: registered all the same
   };
   const ResolveCase local = {true, "build7.lab.example", nullptr, L"", nullptr, nullptr};
   g_case = &local;
   UseHostResolver(&kFakeResolver);
   for (const auto& c : cases) {
-    SCOPED_TRACE(c.store * 2 + c.taken);
+    SCOPED_TRACE(&c - cases);
     TempPrefix prefix;
     const fs::path folder = prefix.Drive('d') / "Jobs" / "A";
     const fs::path settings = folder / "[_KYR_HotFolder_]",
@@ -114,10 +119,17 @@ TEST(Registration, RetiringAndRefusal) {
       engine.m_FolderSettings.GetOrInsert("HFFolderPath") = "D:\\Jobs\\A";
       engine.m_FolderSettings.GetOrInsert("ServerAddr") = "LOCALHOST";
       engine.m_CurrentEnabled = c.store != kRegistered || round == 0;
+      FailNextMoves(c.busy, MoveOutcome::kBusy);
       EXPECT_EQ(engine.RegisterHotFolder(), round == 0 || c.store == kGood);
       if (round == 0) fs::rename(retired, settings);
     }
-    const bool moved = c.store == kGood && !c.taken;
+    // Each busy move waits a little longer than the one before, a few
+    // seconds in all; then the first move and the one after clearing the
+    // attributes have been tried as often as they may be.
+    constexpr int kMostAttempts = 12;
+    const int attempts = c.busy - FailNextMoves(0, MoveOutcome::kBusy);
+    EXPECT_EQ(attempts, std::min(c.busy, kMostAttempts));
+    const bool moved = c.store == kGood && !c.taken && c.busy < kMostAttempts;
     EXPECT_EQ(fs::exists(settings), !moved);
     EXPECT_EQ(fs::exists(retired), moved || c.taken);
     std::uint32_t attributes = 0;

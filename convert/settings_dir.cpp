@@ -2,6 +2,9 @@
 
 #include <wx/filename.h>
 
+#include <chrono>
+#include <thread>
+
 #include "platform/platform.h"
 
 namespace {
@@ -27,10 +30,37 @@ void ClearBlockingAttributes(const wxString& path, std::optional<std::uint32_t> 
   platform::SetFileAttributes(path.ToStdWstring(), *attributes & ~kBlockingAttributes);
 }
 
+// A busy directory (another process holds a handle inside it) is tried
+// again with growing pauses, as SQLite's Windows layer does for busy files:
+// at most kBusyRetries more attempts per folder, 50 ms, 100 ms, ... apart,
+// under 3 s in all. Any other failure is not waited for.
+constexpr int kBusyRetries = 10;
+constexpr auto kBusyPause = std::chrono::milliseconds(50);
+
+class BusyRetries {
+ public:
+  // False once the folder's retries are spent; otherwise pauses first.
+  bool WaitForAnother() {
+    if (used_ == kBusyRetries) return false;
+    ++used_;
+    std::this_thread::sleep_for(kBusyPause * used_);
+    return true;
+  }
+
+ private:
+  int used_ = 0;
+};
+
 // Both names live in the hot folder itself, whose entries are synced. A
 // sync the host refuses does not undo the move, which has happened.
-bool Move(const FolderPaths& paths, const wxString& from, const wxString& to) {
-  if (!platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring())) return false;
+bool Move(const FolderPaths& paths, const wxString& from, const wxString& to,
+          BusyRetries* retries) {
+  for (;;) {
+    const platform::MoveOutcome outcome =
+        platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring());
+    if (outcome == platform::MoveOutcome::kMoved) break;
+    if (outcome != platform::MoveOutcome::kBusy || !retries->WaitForAnother()) return false;
+  }
   platform::SyncDirectory(paths.full_path.ToStdWstring());
   return true;
 }
@@ -56,14 +86,15 @@ wxString LegacyConfigPath(const wxString& listed_folder) {
 
 Retirement RetireSettingsDirectory(const FolderPaths& paths) {
   Retirement retirement;
+  BusyRetries retries;
   // The attributes read to be restored are the ones cleared before the
   // first move; a second attempt reads them afresh.
   retirement.attributes = ReadAttributes(paths.settings);
   ClearBlockingAttributes(paths.settings, retirement.attributes);
-  retirement.moved = Move(paths, paths.settings, paths.retired);
+  retirement.moved = Move(paths, paths.settings, paths.retired, &retries);
   if (!retirement.moved) {
     ClearBlockingAttributes(paths.settings, ReadAttributes(paths.settings));
-    retirement.moved = Move(paths, paths.settings, paths.retired);
+    retirement.moved = Move(paths, paths.settings, paths.retired, &retries);
   }
   return retirement;
 }
@@ -72,12 +103,14 @@ void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retire
   if (!retirement.moved) return;
   // A failed move back leaves the directory where it is; there is nothing
   // safer to do with it.
-  if (!Move(paths, paths.retired, paths.settings)) return;
+  BusyRetries retries;
+  if (!Move(paths, paths.retired, paths.settings, &retries)) return;
   if (retirement.attributes) {
     platform::SetFileAttributes(paths.settings.ToStdWstring(), *retirement.attributes);
   }
 }
 
 bool PutBackSettingsDirectory(const FolderPaths& paths) {
-  return Move(paths, paths.retired, paths.settings);
+  BusyRetries retries;
+  return Move(paths, paths.retired, paths.settings, &retries);
 }

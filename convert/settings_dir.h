@@ -34,9 +34,10 @@ struct Retirement {
 
 // Clears read-only and system (nothing else) and moves the settings directory
 // to its retired name, once more after clearing again if the first move
-// fails. An existing retired directory is never replaced. A move is made
-// durable before this returns, so that no store commit after it can outlive
-// it in a power loss.
+// fails. An existing retired directory is never replaced. A busy directory
+// is waited for up to a few seconds before a move counts as failed. A move
+// is made durable before this returns, so that no store commit after it can
+// outlive it in a power loss.
 Retirement RetireSettingsDirectory(const FolderPaths& paths);
 
 // Puts a retired settings directory back under its own name, with the
@@ -45,8 +46,8 @@ Retirement RetireSettingsDirectory(const FolderPaths& paths);
 void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retirement);
 
 // Puts a retired settings directory back under its own name, durably, for a
-// folder an interrupted run retired but never registered. Its attributes
-// stay as retiring left them.
+// folder an interrupted run retired but never registered. Its attributes stay as
+// retiring left them.
 bool PutBackSettingsDirectory(const FolderPaths& paths);
 
 #endif  // HF_CONVERT_SETTINGS_DIR_H_

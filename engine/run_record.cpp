@@ -159,7 +159,8 @@ bool SetAsideRunRecord() {
     if (n > 1) aside += L"-" + std::to_wstring(n);
     if (platform::FileExists(aside) || platform::DirectoryExists(aside)) continue;
     return platform::RenameFile(path, aside) ||
-           (platform::DirectoryExists(path) && platform::MoveDirectory(path, aside));
+           (platform::DirectoryExists(path) &&
+            platform::MoveDirectory(path, aside) == platform::MoveOutcome::kMoved);
   }
   return false;
 }

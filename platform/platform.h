@@ -99,9 +99,25 @@ bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attribut
 // Sets the attribute bits; DIRECTORY is derived from the file and ignored.
 bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attributes);
 
+// How a directory move ended. kBusy: the host refused it for now, as
+// Windows does while another process holds a handle inside the directory
+// (a sharing or lock violation, access denied; on POSIX hosts EBUSY, EACCES
+// and EPERM); it may succeed when tried again. kFailed: any other failure.
+enum class MoveOutcome { kMoved, kBusy, kFailed };
+
 // Moves (renames) a directory. Fails, changing nothing, when the target
 // exists: an existing directory is never replaced.
-bool MoveDirectory(const std::wstring& from, const std::wstring& to);
+MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to);
+
+// For tests, on every host: after letting `skip` moves through, the next
+// `count` calls of MoveDirectory answer `outcome` and touch nothing.
+// Answers how many refusals an earlier call left unused, so
+// FailNextMoves(0, ...) ends them and tells how many moves were tried. On
+// POSIX hosts the environment variable HF_TEST_FAIL_MOVES ("<count> busy"
+// or "<count> failed", then optionally the moves to skip), read at the
+// first move, does the same for a built program. The Windows layer reads
+// no such variable: a shipped tool cannot be steered into refusing moves.
+int FailNextMoves(int count, MoveOutcome outcome, int skip = 0);
 
 // Makes the entries of a directory durable: a rename or a new file inside it
 // survives a power loss once this answers true.

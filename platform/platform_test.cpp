@@ -107,12 +107,32 @@ TEST(FileTest, DirectoriesFilesAndMoves) {
                platform::DirectoryExists(scratch.Path(L"old\\folder.cfg")) ||
                platform::FileExists(scratch.Path(L"missing")));
 
+  using platform::MoveOutcome;
+  const auto move = [&](const wchar_t* from, const wchar_t* to) {
+    return platform::MoveDirectory(scratch.Path(from), scratch.Path(to));
+  };
   for (const wchar_t* target : {L"taken", L"empty"})
-    EXPECT_FALSE(platform::MoveDirectory(scratch.Path(L"old"), scratch.Path(target))) << target;
+    EXPECT_EQ(move(L"old", target), MoveOutcome::kFailed) << target;
   EXPECT_EQ(scratch.Read(L"taken\\keep.txt"), "taken");
-  EXPECT_TRUE(platform::MoveDirectory(scratch.Path(L"old"), scratch.Path(L"new")));
+  // Refusals set for a test answer as asked and touch nothing.
+  EXPECT_EQ(platform::FailNextMoves(2, MoveOutcome::kBusy), 0);
+  EXPECT_EQ(move(L"old", L"new"), MoveOutcome::kBusy);
+  EXPECT_EQ(platform::FailNextMoves(3, MoveOutcome::kFailed), 1);
+  EXPECT_EQ(move(L"old", L"new"), MoveOutcome::kFailed);
+  EXPECT_EQ(platform::FailNextMoves(0, MoveOutcome::kFailed), 2);
+  EXPECT_TRUE(platform::DirectoryExists(scratch.Path(L"old")));
+  EXPECT_EQ(move(L"old", L"new"), MoveOutcome::kMoved);
   EXPECT_EQ(scratch.Read(L"new\\folder.cfg"), "old");
-  EXPECT_FALSE(platform::MoveDirectory(scratch.Path(L"missing"), scratch.Path(L"other")));
+  EXPECT_EQ(move(L"missing", L"other"), MoveOutcome::kFailed);
+#ifndef _WIN32
+  // A directory made immutable refuses every rename inside it (EPERM), as
+  // Windows refuses one while a handle is held: busy, for the caller.
+  const std::string parent = platform::ToHostPath(scratch.Path(L"new"));
+  if (system(("chattr +i '" + parent + "' 2>/dev/null").c_str()) == 0) {
+    EXPECT_EQ(move(L"new\\folder.cfg", L"new\\renamed"), MoveOutcome::kBusy);
+    EXPECT_EQ(system(("chattr -i '" + parent + "'").c_str()), 0);
+  }
+#endif
 }
 
 TEST(FileTest, AttributesRoundTrip) {

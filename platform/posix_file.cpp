@@ -11,6 +11,7 @@
 #include <cstdlib>
 #include <string>
 
+#include "platform/move_seam.h"
 #include "platform/platform.h"
 #include "platform/posix_internal.h"
 
@@ -146,19 +147,54 @@ NoReplace RenameNoReplace(const HostPath& source, const HostPath& target) {
 
 }  // namespace
 
-bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
+namespace {
+
+MoveOutcome FailedMove(int error) {
+  return error == EBUSY || error == EACCES || error == EPERM ? MoveOutcome::kBusy
+                                                             : MoveOutcome::kFailed;
+}
+
+// HF_TEST_FAIL_MOVES, "<count> busy" or "<count> failed" and optionally
+// the moves to let through first: refusals for a test of the built
+// programs. Read once, before the first move.
+void ReadMoveRefusals() {
+  static const bool read = [] {
+    const char* text = getenv("HF_TEST_FAIL_MOVES");
+    char kind[8] = {};
+    int count = 0, skip = 0;
+    if (text != nullptr && sscanf(text, "%d %7s %d", &count, kind, &skip) >= 2) {
+      const std::string name(kind);
+      if (name == "busy" || name == "failed") {
+        FailNextMoves(count, name == "busy" ? MoveOutcome::kBusy : MoveOutcome::kFailed, skip);
+      }
+    }
+    return true;
+  }();
+  (void)read;
+}
+
+}  // namespace
+
+MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to) {
+  ReadMoveRefusals();
+  MoveOutcome refused;
+  if (TakeFailedMove(&refused)) return refused;
   const HostPath source = ToHostPath(from);
   const HostPath target = ToHostPath(to);
   const NoReplace moved = RenameNoReplace(source, target);
-  if (moved != NoReplace::kUnsupported) return moved == NoReplace::kDone;
+  if (moved == NoReplace::kDone) return MoveOutcome::kMoved;
+  if (moved == NoReplace::kFailed) {
+    return source.empty() || target.empty() ? MoveOutcome::kFailed : FailedMove(errno);
+  }
   // The file system cannot refuse to replace by itself. Reserving the name
   // with mkdir is atomic, and rename replaces only that empty placeholder.
   struct stat st;
-  if (stat(source.c_str(), &st) != 0 || !S_ISDIR(st.st_mode)) return false;
-  if (mkdir(target.c_str(), 0700) != 0) return false;
-  if (rename(source.c_str(), target.c_str()) == 0) return true;
+  if (stat(source.c_str(), &st) != 0 || !S_ISDIR(st.st_mode)) return MoveOutcome::kFailed;
+  if (mkdir(target.c_str(), 0700) != 0) return FailedMove(errno);
+  if (rename(source.c_str(), target.c_str()) == 0) return MoveOutcome::kMoved;
+  const int error = errno;
   rmdir(target.c_str());
-  return false;
+  return FailedMove(error);
 }
 
 bool SyncDirectory(const std::wstring& windows_path) {

@@ -2,6 +2,7 @@
 // was built around, so paths need no mapping and names are passed through as
 // they are. Each handle this file opens is closed before the call returns,
 // except the one mutex a process asks to hold for its whole life.
+#include "platform/move_seam.h"
 #include "platform/platform.h"
 
 // winsock2.h must come before windows.h, which would pull in the old winsock.
@@ -214,9 +215,25 @@ bool SetFileAttributes(const std::wstring& windows_path, std::uint32_t attribute
   return SetFileAttributesW(ToLongHostPath(windows_path).c_str(), settable) != 0;
 }
 
-bool MoveDirectory(const std::wstring& from, const std::wstring& to) {
+// Another process holding a handle inside the directory (the service, an
+// Explorer window, a backup agent, a virus scanner) makes the move fail for
+// as long as it holds it; every other error stays.
+MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to) {
+  MoveOutcome refused;
+  if (TakeFailedMove(&refused)) return refused;
+  if (HasNul(from) || HasNul(to)) return MoveOutcome::kFailed;
   // Without MOVEFILE_REPLACE_EXISTING an existing target makes the move fail.
-  return MoveFileW(ToLongHostPath(from).c_str(), ToLongHostPath(to).c_str()) != 0;
+  if (MoveFileW(ToLongHostPath(from).c_str(), ToLongHostPath(to).c_str())) {
+    return MoveOutcome::kMoved;
+  }
+  switch (GetLastError()) {
+    case ERROR_SHARING_VIOLATION:
+    case ERROR_LOCK_VIOLATION:
+    case ERROR_ACCESS_DENIED:
+      return MoveOutcome::kBusy;
+    default:
+      return MoveOutcome::kFailed;
+  }
 }
 
 // A directory opened for writing can be flushed: NTFS then writes its

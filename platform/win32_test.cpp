@@ -140,7 +140,7 @@ TEST(Win32, LongPathsNameTheSameFileAtAnyLength) {
   EXPECT_TRUE(platform::RenameFile(file, file + L".aside") &&
               platform::RenameFile(file + L".aside", file));
   const std::wstring retired = deep + L"\\[_KYR_HotFolder_Old]";
-  EXPECT_TRUE(platform::MoveDirectory(settings, retired));
+  EXPECT_EQ(platform::MoveDirectory(settings, retired), platform::MoveOutcome::kMoved);
   EXPECT_TRUE(platform::FileExists(retired + L"\\folder.cfg"));
   EXPECT_TRUE(platform::RemoveFile(retired + L"\\folder.cfg") &&
               !platform::FileExists(retired + L"\\folder.cfg"));
