@@ -50,6 +50,8 @@ void CHFMigrator::BeginRun() {
     case RunRecordState::kNone:
       break;
   }
+  // What the interrupted run left and this run could not finish.
+  m_RunUndecided = !entries.empty();
   // The folders this run will retire: those the folder reader will find.
   // One that has a retired directory already keeps it, as the move fails.
   for (const wxString& folder : m_Folders) {
@@ -64,8 +66,10 @@ void CHFMigrator::BeginRun() {
 }
 
 // A record this run could not write may still hold what an earlier run
-// left undecided, so only this run's own record is removed.
+// left undecided, so only this run's own record is removed, and only when
+// it names nothing undecided.
 void CHFMigrator::EndRun() {
-  if (m_RunRecorded) RemoveRunRecord();
+  if (m_RunRecorded && !m_RunUndecided) RemoveRunRecord();
   m_RunRecorded = false;
+  m_RunUndecided = false;
 }

@@ -99,9 +99,16 @@ bool CHFMigrator::RegisterHotFolder() {
   if (!m_CurrentEnabled) store.CreateNextDisabled(setting.FolderPath);
   Retirement retirement = RetireSettingsDirectory(paths);
   bool registered = store.CreateHotFolder(setting, folder, job, filter, impose, preflight) != 0;
-  // Nothing was created, so the legacy settings go back where a later run
-  // finds them.
-  if (!registered) RestoreSettingsDirectory(paths, retirement);
+  // A folder refused because its path is registered already is in the
+  // store (an earlier run registered it while its move failed or was lost
+  // in a power cut): its settings stay retired. Any other refusal created
+  // nothing, so the legacy settings go back where a later run finds them.
+  // That move back may fail, and it is not synced: the run keeps its record
+  // either way, so that the next run puts them back if they lie retired.
+  if (!registered && !store.RefusedAsRegistered() && retirement.moved) {
+    RestoreSettingsDirectory(paths, retirement);
+    m_RunUndecided = true;
+  }
   if (registered && !m_CurrentEnabled) {
     registered = RODuriZudaze::GetInstance().DisableHotFolder(setting.FolderPath);
   }

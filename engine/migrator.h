@@ -31,7 +31,8 @@ class CHFMigrator {
   // app/run_guard.cpp. BeginRun finishes what an interrupted run left (it
   // puts back the settings of folders that run retired but never
   // registered), then records durably which listed folders this run is
-  // about to retire; EndRun removes the record of a complete run.
+  // about to retire; EndRun removes the record of a complete run that left
+  // nothing undecided.
   void BeginRun();
   void EndRun();
 
@@ -64,6 +65,10 @@ class CHFMigrator {
   std::map<std::size_t, std::string> m_UndecodedPaths;
   bool m_CurrentEnabled = true;  // the folder now being converted
   bool m_RunRecorded = false;    // BeginRun left the record of this run
+  // Settings of some folder may lie retired though it is not registered (a
+  // refused folder's move back, a folder an interrupted run left that this
+  // run could not finish): the run's record stays for the next run.
+  bool m_RunUndecided = false;
 
   // The 31 settings maps. "Conv" maps hold a legacy filter's converted
   // settings.

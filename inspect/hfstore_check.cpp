@@ -64,8 +64,13 @@ FolderCheck CheckFolder(const Sources& sources, const wxString& folder, bool lis
       check.detail = wxString("listed ") + EnabledWord(listed_enabled) + ", stored " +
                      EnabledWord(check.stored->enabled);
     } else if (has_config) {
+      // A retired directory already there is never replaced, so no run
+      // can move these settings; otherwise the next run retires them.
       check.result = kNotRetired;
-      check.detail = "registered, but its settings are still at " + config;
+      check.detail = "registered, but its settings are still at " + config + ": " +
+                     (platform::DirectoryExists(paths.retired.ToStdWstring())
+                          ? paths.retired + " already exists"
+                          : wxString("run hfmigrate again"));
     } else {
       check.result = kMigrated;
       check.detail = wxString(EnabledWord(listed_enabled)) + ", as listed";

@@ -46,6 +46,12 @@ const db::StoreLocation& Location() {
   return location;
 }
 
+// Why the last CreateHotFolder answered what it did.
+db::CreateResult& LastCreation() {
+  static db::CreateResult result = db::CreateResult::kFailed;
+  return result;
+}
+
 }  // namespace
 
 // The tool asks for the store just before it hands over a folder whose legacy
@@ -69,13 +75,20 @@ long RODuriZudaze::CreateHotFolder(db::Setting& setting, db::FolderConfiguration
                                    db::PreflightConfiguration& preflight) {
   std::optional<wxString> disabled;
   disabled.swap(NextDisabled());
+  LastCreation() = db::CreateResult::kFailed;
   try {
     db::HotFolderRecords records{setting, folder, job, filter, impose, preflight};
     const bool enabled = !disabled || *disabled != setting.FolderPath;
-    return Writer().Create(Location(), records, enabled) == db::CreateResult::kCreated ? 1 : 0;
+    LastCreation() = Writer().Create(Location(), records, enabled);
+    return LastCreation() == db::CreateResult::kCreated ? 1 : 0;
   } catch (...) {
+    LastCreation() = db::CreateResult::kFailed;
     return 0;
   }
+}
+
+bool RODuriZudaze::RefusedAsRegistered() const {
+  return LastCreation() == db::CreateResult::kAlreadyRegistered;
 }
 
 void RODuriZudaze::CreateNextDisabled(const wxString& folderPath) {

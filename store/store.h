@@ -9,8 +9,9 @@
 // Beyond the service's calls the store offers the tool two of its own: a
 // folder announced as disabled before its CreateHotFolder is stored
 // disabled in that one transaction (the DisableHotFolder that follows then
-// finds it so and answers true without a second commit), and a question
-// whether a folder path is registered, for finishing an interrupted run.
+// finds it so and answers true without a second commit), why the last
+// creation was refused, and a question whether a folder path is
+// registered, for finishing an interrupted run.
 #ifndef HF_STORE_STORE_H_
 #define HF_STORE_STORE_H_
 
@@ -33,6 +34,11 @@ class RODuriZudaze {
   // The next CreateHotFolder, if it is of this folder path, stores the
   // folder disabled. Any CreateHotFolder forgets the announcement.
   void CreateNextDisabled(const wxString& folderPath);
+
+  // Whether the last CreateHotFolder answered 0 because a hot folder of
+  // that FolderPath is stored already: then that folder is in the store,
+  // and nothing is wrong with it.
+  bool RefusedAsRegistered() const;
 
   enum class Registration { kRegistered, kNotRegistered, kUnknown };
   // Whether a hot folder of that path is stored; kUnknown when the store

@@ -48,11 +48,15 @@ const Row kRows[] = {
      "enabled state differs\tD:\\Jobs\\G\tlisted disabled, stored enabled"},
     {"H", true, 1, true, false, false,
      "settings not retired\tD:\\Jobs\\H\tregistered, but its settings are still at "
-     "D:\\Jobs\\H\\[_KYR_HotFolder_]\\folder.cfg"},
+     "D:\\Jobs\\H\\[_KYR_HotFolder_]\\folder.cfg: run hfmigrate again"},
     // Not UTF-8, the machine's ANSI code page here: named by its bytes.
     {"Caf\xE9", true, -1, true, false, false,
      "path not decodable\tD:\\Jobs\\Caf\\xE9\tthe list's bytes for this path do not decode in "
      "this machine's ANSI code page: hfmigrate cannot find the folder"},
+    {"I", true, 1, true, true, false,
+     "settings not retired\tD:\\Jobs\\I\tregistered, but its settings are still at "
+     "D:\\Jobs\\I\\[_KYR_HotFolder_]\\folder.cfg: D:\\Jobs\\I\\[_KYR_HotFolder_Old] already "
+     "exists"},
 };
 constexpr int kAsListed = 5;  // the first rows: a run that went well
 
@@ -99,8 +103,8 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
   std::string expected;
   for (const Row& row : kRows) expected += std::string(row.line) + "\n";
   expected +=
-      "10 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
-      " 1 settings not retired, 1 path not decodable; not every folder with legacy settings is"
+      "11 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
+      " 2 settings not retired, 1 path not decodable; not every folder with legacy settings is"
       " migrated as listed\n";
   CapturedRun run = Hfstore({"check"});
   EXPECT_EQ(run.status, 1) << run.err;
@@ -176,6 +180,32 @@ TEST(RunRecord, TrustedOnlyWhenWholeAndOurs) {
     EXPECT_FALSE(fs::exists(record));
     EXPECT_EQ(TempPrefix::ReadFile(record.string() + ".damaged"), c.set_aside ? c.record : "");
   }
+}
+
+// The store refuses both folders (its file is damaged) and X's move back
+// fails: X lies retired and unregistered, and the run keeps its record, so
+// that the next run, with the store mended, puts X back and migrates it.
+TEST(RunRecord, KeptWhileAFolderIsUndecided) {
+  TempPrefix prefix;
+  const Row rows[] = {{"X", true, -1, true, false, false, ""},
+                      {"Y", true, -1, true, false, false, ""}};
+  Lay(prefix, rows, 2);
+  const fs::path record = prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run";
+  prefix.WriteFile(fs::path(StoreHostPath()), std::string(4096, 'x'));
+  platform::FailNextMoves(1, platform::MoveOutcome::kFailed, /*skip=*/1);
+  CHFMigrator().Run();
+  EXPECT_EQ(platform::FailNextMoves(0, platform::MoveOutcome::kFailed), 0);
+  EXPECT_EQ(TempPrefix::ReadFile(record),
+            EncodeRunRecord({{"D:\\Jobs\\X", true}, {"D:\\Jobs\\Y", true}}));
+  EXPECT_TRUE(fs::exists(OnDriveD(prefix, "Jobs/X/[_KYR_HotFolder_Old]/folder.cfg")));
+  EXPECT_TRUE(fs::exists(OnDriveD(prefix, "Jobs/Y/[_KYR_HotFolder_]/folder.cfg")));
+
+  RODuriZudaze::GetInstance().Close();
+  fs::remove(StoreHostPath());
+  CHFMigrator().Run();
+  CapturedRun run = Hfstore({"check"});
+  EXPECT_EQ(run.status, 0) << run.out;
+  EXPECT_FALSE(fs::exists(record));
 }
 
 }  // namespace

@@ -124,4 +124,44 @@ TEST(Migration, InstallationEndToEnd) {
   }
 }
 
+// A refused move (both attempts at A's, the first folder's) and a move
+// lost after its commit was durable (C's, put back by hand after the run):
+// each folder is registered once, and a second run retires what is left
+// without changing what the store holds.
+TEST(Migration, RefusedOrLostMovesFinishedByTheNextRun) {
+  TempPrefix prefix;
+  RunningServer server;
+  std::vector<LegacyFolder> listed;
+  for (const char* name : {"A", "B", "C"}) {
+    WriteFolderConfig(prefix, std::string("Jobs/") + name, "<HotFolderConfiguration/>");
+    listed.push_back(
+        {std::string("D:\\Jobs\\") + name, static_cast<std::uint16_t>(*name == 'A' ? 0 : 2)});
+  }
+  WriteLegacyList(prefix, listed);
+  const auto settings = [&](const char* name, const char* dir) {
+    return OnDriveD(prefix, std::string("Jobs/") + name) / dir;
+  };
+  setenv("HF_TEST_FAIL_MOVES", "2 failed", 1);
+  EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
+  unsetenv("HF_TEST_FAIL_MOVES");
+  CapturedRun check = RunCaptured(BinDir() + "/hfstore", {"check"});
+  EXPECT_EQ(check.status, 1);
+  EXPECT_NE(check.out.find("settings not retired\tD:\\Jobs\\A\t"), std::string::npos) << check.out;
+  EXPECT_NE(check.out.find(": run hfmigrate again\n"), std::string::npos) << check.out;
+  const json stored = Dump();
+  fs::rename(settings("C", "[_KYR_HotFolder_Old]"), settings("C", "[_KYR_HotFolder_]"));
+
+  EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
+  EXPECT_EQ(json::diff(stored, Dump()).dump(1), "[]");
+  EXPECT_EQ(stored["hotFolders"].size(), 3u);
+  check = RunCaptured(BinDir() + "/hfstore", {"check"});
+  EXPECT_EQ(check.status, 0) << check.out;
+  for (const char* name : {"A", "B", "C"}) {
+    EXPECT_TRUE(fs::exists(settings(name, "[_KYR_HotFolder_Old]/folder.cfg")) &&
+                !fs::exists(settings(name, "[_KYR_HotFolder_]")))
+        << name;
+  }
+  EXPECT_FALSE(fs::exists(prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run"));
+}
+
 }  // namespace
