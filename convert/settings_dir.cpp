@@ -51,18 +51,16 @@ class BusyRetries {
   int used_ = 0;
 };
 
-// Both names live in the hot folder itself, whose entries are synced. A
-// sync the host refuses does not undo the move, which has happened.
-bool Move(const FolderPaths& paths, const wxString& from, const wxString& to,
-          BusyRetries* retries) {
+// No sync follows a move: a move lost in a power cut is finished by the
+// next run (the store refuses the folder as registered and its settings
+// stay retired) or undone by the run record (section 5 of the design).
+bool Move(const wxString& from, const wxString& to, BusyRetries* retries) {
   for (;;) {
     const platform::MoveOutcome outcome =
         platform::MoveDirectory(from.ToStdWstring(), to.ToStdWstring());
-    if (outcome == platform::MoveOutcome::kMoved) break;
+    if (outcome == platform::MoveOutcome::kMoved) return true;
     if (outcome != platform::MoveOutcome::kBusy || !retries->WaitForAnother()) return false;
   }
-  platform::SyncDirectory(paths.full_path.ToStdWstring());
-  return true;
 }
 
 }  // namespace
@@ -91,10 +89,10 @@ Retirement RetireSettingsDirectory(const FolderPaths& paths) {
   // first move; a second attempt reads them afresh.
   retirement.attributes = ReadAttributes(paths.settings);
   ClearBlockingAttributes(paths.settings, retirement.attributes);
-  retirement.moved = Move(paths, paths.settings, paths.retired, &retries);
+  retirement.moved = Move(paths.settings, paths.retired, &retries);
   if (!retirement.moved) {
     ClearBlockingAttributes(paths.settings, ReadAttributes(paths.settings));
-    retirement.moved = Move(paths, paths.settings, paths.retired, &retries);
+    retirement.moved = Move(paths.settings, paths.retired, &retries);
   }
   return retirement;
 }
@@ -104,7 +102,7 @@ void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retire
   // A failed move back leaves the directory where it is; there is nothing
   // safer to do with it.
   BusyRetries retries;
-  if (!Move(paths, paths.retired, paths.settings, &retries)) return;
+  if (!Move(paths.retired, paths.settings, &retries)) return;
   if (retirement.attributes) {
     platform::SetFileAttributes(paths.settings.ToStdWstring(), *retirement.attributes);
   }
@@ -112,5 +110,5 @@ void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retire
 
 bool PutBackSettingsDirectory(const FolderPaths& paths) {
   BusyRetries retries;
-  return Move(paths, paths.retired, paths.settings, &retries);
+  return Move(paths.retired, paths.settings, &retries);
 }

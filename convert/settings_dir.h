@@ -35,9 +35,9 @@ struct Retirement {
 // Clears read-only and system (nothing else) and moves the settings directory
 // to its retired name, once more after clearing again if the first move
 // fails. An existing retired directory is never replaced. A busy directory
-// is waited for up to a few seconds before a move counts as failed. A move
-// is made durable before this returns, so that no store commit after it can
-// outlive it in a power loss.
+// is waited for up to a few seconds before a move counts as failed. No
+// move is synced: the store's commit and the run record are what a power
+// loss must not undo.
 Retirement RetireSettingsDirectory(const FolderPaths& paths);
 
 // Puts a retired settings directory back under its own name, with the
@@ -45,8 +45,8 @@ Retirement RetireSettingsDirectory(const FolderPaths& paths);
 // stay within reach of a later run. Does nothing unless this run moved it.
 void RestoreSettingsDirectory(const FolderPaths& paths, const Retirement& retirement);
 
-// Puts a retired settings directory back under its own name, durably, for a
-// folder an interrupted run retired but never registered. Its attributes stay as
+// Puts a retired settings directory back under its own name, for a folder
+// an interrupted run retired but never registered. Its attributes stay as
 // retiring left them.
 bool PutBackSettingsDirectory(const FolderPaths& paths);
 

@@ -119,10 +119,6 @@ MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to);
 // no such variable: a shipped tool cannot be steered into refusing moves.
 int FailNextMoves(int count, MoveOutcome outcome, int skip = 0);
 
-// Makes the entries of a directory durable: a rename or a new file inside it
-// survives a power loss once this answers true.
-bool SyncDirectory(const std::wstring& windows_path);
-
 // Writes a file anew, durably: the bytes go to a file beside it ("<name>.new",
 // created new, never through a link; a stale entry of that name is removed
 // first), are flushed, and that file is renamed over the old one, so a reader

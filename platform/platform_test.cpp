@@ -174,7 +174,7 @@ TEST(FileTest, AttributesRoundTrip) {
 }
 
 // The run record's file services: a whole new file or none, no replacing
-// rename, removal that leaves nothing, and synced directories.
+// rename, and removal that leaves nothing.
 TEST(FileTest, DurableFilesRenamesAndRemovals) {
   Scratch scratch;
   const std::wstring file = scratch.Path(L"run"), aside = scratch.Path(L"run.aside");
@@ -189,8 +189,6 @@ TEST(FileTest, DurableFilesRenamesAndRemovals) {
   EXPECT_TRUE(platform::RemoveFile(aside));  // none left is what was asked
   ASSERT_TRUE(platform::CreateDirectories(scratch.Path(L"dir")));
   EXPECT_FALSE(platform::RemoveFile(scratch.Path(L"dir")));
-  EXPECT_TRUE(platform::SyncDirectory(scratch.Path(L"dir")));
-  EXPECT_FALSE(platform::SyncDirectory(scratch.Path(L"missing")));
   EXPECT_FALSE(platform::ReplaceFileDurably(scratch.Path(L"missing\\run"), "x"));
 }
 

@@ -197,11 +197,6 @@ MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to) {
   return FailedMove(error);
 }
 
-bool SyncDirectory(const std::wstring& windows_path) {
-  const HostPath host = ToHostPath(windows_path);
-  return !host.empty() && SyncHostDirectory(host);
-}
-
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
   const HostPath host = ToHostPath(windows_path);
   if (host.empty()) return false;

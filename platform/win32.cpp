@@ -236,18 +236,6 @@ MoveOutcome MoveDirectory(const std::wstring& from, const std::wstring& to) {
   }
 }
 
-// A directory opened for writing can be flushed: NTFS then writes its
-// entries, a rename inside it included, to the disk.
-bool SyncDirectory(const std::wstring& windows_path) {
-  if (HasNul(windows_path)) return false;
-  ScopedHandle directory(
-      FileHandle(CreateFileW(ToLongHostPath(windows_path).c_str(), GENERIC_READ | GENERIC_WRITE,
-                             FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
-                             OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr)));
-  if (directory.get() == nullptr) return false;
-  return FlushFileBuffers(directory.get()) != 0;
-}
-
 bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& bytes) {
   if (HasNul(windows_path)) return false;
   // A stale entry under the temporary name goes first (DeleteFileW removes a

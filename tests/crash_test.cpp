@@ -8,10 +8,12 @@
 // retired, and a "[_KYR_HotFolder_Old]" that was there before the first run
 // is untouched.
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 #include <nlohmann/json.hpp>
 
 #include <cstdio>
 #include <map>
+#include <optional>
 #include <random>
 #include <regex>
 #include <set>
@@ -131,10 +133,37 @@ std::vector<int> CheckBetweenKills(const Installation& installation) {
   return numbers;
 }
 
+// Holds the store's write lock while it lives, so that a run that has just
+// moved a folder's settings waits at that folder's commit (for the store's
+// busy timeout) and is killed there. A store not made yet is not locked.
+class StoreWriteLock {
+ public:
+  StoreWriteLock() {
+    if (!fs::exists(StoreHostPath()) ||
+        sqlite3_open_v2(StoreHostPath().c_str(), &db_, SQLITE_OPEN_READWRITE, nullptr) !=
+            SQLITE_OK ||
+        sqlite3_exec(db_, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr) != SQLITE_OK) {
+      sqlite3_close(db_);
+      db_ = nullptr;
+    }
+  }
+  ~StoreWriteLock() {
+    sqlite3_exec(db_, "ROLLBACK", nullptr, nullptr, nullptr);
+    sqlite3_close(db_);
+  }
+  StoreWriteLock(const StoreWriteLock&) = delete;
+  StoreWriteLock& operator=(const StoreWriteLock&) = delete;
+
+ private:
+  sqlite3* db_ = nullptr;
+};
+
 // Each run is killed at one of four moments: while it finishes an
 // interrupted run, the moment it has put the settings back; during start-up
 // (the run record is written then); just after a move, before its commit,
-// which leaves a folder interrupted; or anywhere from that move to a few
+// which leaves a folder interrupted (the store held locked, so that the run
+// waits there; the folder is the first one left, unless a rerun must put
+// back an interrupted one first); or anywhere from that move to a few
 // folders later. The folder it is killed at lies a
 // random way into an even share of the folders left, so that the kills are
 // spread over the whole migration.
@@ -159,8 +188,12 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
     const bool after_move = !in_recovery && random() % 4 == 0;
     const bool in_startup = !in_recovery && !after_move && random() % 6 == 0;
     const int share = (kFolders - next) / (kKillsAimedAt - kills + 1);
-    const int target = std::min(kFolders - 1, next + static_cast<int>(random() % (share + 1)));
+    const bool at_commit = after_move && interrupted.empty() && next < kFolders;
+    const int target =
+        at_commit ? next : std::min(kFolders - 1, next + static_cast<int>(random() % (share + 1)));
     const int watched = in_recovery ? interrupted[0] : target;
+    std::optional<StoreWriteLock> store_lock;
+    if (at_commit) store_lock.emplace();
     pid_t pid = StartProgram(tool);
     ASSERT_GT(pid, 0);
     const auto start = std::chrono::steady_clock::now();
@@ -174,7 +207,9 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
       std::this_thread::sleep_for(std::chrono::microseconds(random() % 20000));
     }
     kill(pid, SIGKILL);
-    if (WaitProgram(pid) != -1) continue;  // a run that ended first was not killed
+    const int status = WaitProgram(pid);
+    store_lock.reset();
+    if (status != -1) continue;  // a run that ended first was not killed
     ++kills;
     // Killed after putting settings back, before its own record replaced
     // the one it was finishing.
