@@ -139,6 +139,14 @@ TEST(Win32, LongPathsNameTheSameFileAtAnyLength) {
   EXPECT_TRUE(platform::RenameFile(file, file + L".aside") &&
               platform::RenameFile(file + L".aside", file));
   const std::wstring retired = deep + L"\\[_KYR_HotFolder_Old]";
+  // Held open without sharing deletion, as a server or an Explorer window
+  // holds it: busy, not failed.
+  HANDLE held = CreateFileW(platform::ToLongHostPath(settings).c_str(), GENERIC_READ,
+                            FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
+                            FILE_FLAG_BACKUP_SEMANTICS, nullptr);
+  ASSERT_NE(held, INVALID_HANDLE_VALUE);
+  EXPECT_EQ(platform::MoveDirectory(settings, retired), platform::MoveOutcome::kBusy);
+  CloseHandle(held);
   EXPECT_EQ(platform::MoveDirectory(settings, retired), platform::MoveOutcome::kMoved);
   EXPECT_TRUE(platform::FileExists(retired + L"\\folder.cfg"));
   EXPECT_TRUE(platform::RemoveFile(retired + L"\\folder.cfg") &&
