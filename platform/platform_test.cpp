@@ -21,6 +21,7 @@
 #include <sys/xattr.h>
 #include <unistd.h>
 
+#include "tests/cases.h"
 #include "tests/run_program.h"
 #include "tests/temp_prefix.h"
 #endif
@@ -216,37 +217,25 @@ TEST(NetworkTest, ResolvesTheLocalHost) {
 }
 
 #ifndef _WIN32
-// POSIX host: the Wine-style prefix mapping.
+// POSIX host: the Wine-style prefix mapping, the rows of prefix_paths.tsv.
 TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
   TempPrefix prefix;
   for (const char* dir : {"Jobs/Brochures", "Jobs/bin", "Twice/Mixed", "Twice/MIXED"})
     fs::create_directories(prefix.Drive('d') / dir);
-  const std::string devices = prefix.root().string() + "/dosdevices";
-  // The host path after the prefix's dosdevices when it starts with '/', else whole.
-  const std::pair<const wchar_t*, std::string> cases[] = {
-      {L"d:\\jobs\\BROCHURES\\New.txt", "/d:/Jobs/Brochures/New.txt"},
-      {L"D:\\Twice\\mixed", "/d:/Twice/mixed"},  // two candidates: none chosen
-      {L"Q:\\Jobs", "/q:/Jobs"},                 // no such drive
-      {L"\\\\Server\\Share\\a\\b", "/unc/Server/Share/a/b"},
-      {L"\\\\Server\\Share\\..\\..\\x", "/unc/Server/Share/x"},
-      {L"D:\\..\\..\\Jobs", "/d:/Jobs"},
-      {L"D:/Jobs/./Brochures/../Brochures/", "/d:/Jobs/Brochures"},
-      {L"D:\\", "/d:"},
-      {L"rel\\x.cfg", ""},  // relative, from a directory outside every drive
-      {L"", ""},
-  };
-  for (const auto& [windows, host] : cases)
-    EXPECT_EQ(platform::ToHostPath(windows), (host[0] == '/' ? devices : "") + host) << windows;
-
-  // Back through the drive whose target holds it, the longest.
   fs::create_directory_symlink("../drive_d/Jobs", prefix.root() / "dosdevices" / "e:");
-  const std::pair<std::string, std::wstring> back[] = {
-      {(prefix.Drive('d') / "hotfolder.exe").string(), L"D:\\hotfolder.exe"},
-      {(prefix.Drive('d') / "Jobs" / "bin" / "hotfolder.exe").string(), L"E:\\bin\\hotfolder.exe"},
-      {prefix.Drive('c').string(), L"C:\\"},
-      {"/nowhere/hotfolder.exe", L"/nowhere/hotfolder.exe"},
+  const auto host = [&](const std::string& path) {
+    return path.empty() || path[0] == '/' ? path : (prefix.root() / path).string();
   };
-  for (const auto& [host, windows] : back) EXPECT_EQ(platform::FromHostPath(host), windows) << host;
+  const std::vector<CaseRow> cases = ReadCases("platform/prefix_paths.tsv");
+  ASSERT_FALSE(cases.empty());
+  for (const CaseRow& c : cases) {
+    const std::wstring windows(c.at(1).begin(), c.at(1).end());  // ASCII
+    if (c[0] == "to") {
+      EXPECT_EQ(platform::ToHostPath(windows), host(c.at(2))) << c[1];
+    } else {
+      EXPECT_EQ(platform::FromHostPath(host(c.at(2))), windows) << c[2];
+    }
+  }
 
   // A drive is never created, and the all-users folder is on C:.
   EXPECT_FALSE(platform::CreateDirectories(L"Q:\\Jobs"));

@@ -9,6 +9,7 @@
 #include "engine/migrator.h"
 #include "engine/run_record.h"
 #include "store/store_reader.h"
+#include "tests/cases.h"
 #include "tests/legacy_fixture.h"
 #include "tests/run_program.h"
 #include "tests/snapshot.h"
@@ -19,66 +20,50 @@ namespace fs = std::filesystem;
 
 constexpr uid_t kOtherUser = 65534;
 
-struct Row {
-  const char* at;  // below C:\ProgramData\KYR
-  bool directory;  // a link to a directory (what stood there moves behind it)
-  bool target_exists;
-  uid_t owner;  // 0: the running user
-  bool migrated;
-  const char* refusal;  // what hfstore says, or null when it reads the store
-};
-
-const Row kRows[] = {
-    {"Dirorodiv/hfmigrate.run.new", false, true, kOtherUser, true, nullptr},
-    {"Dirorodiv/hfmigrate.run", false, true, kOtherUser, true, nullptr},
-    {"Dirorodiv/HotFolders.db", false, false, kOtherUser, false, "HotFolders.db is a link"},
-    {"Dirorodiv/HotFolders.db-wal", false, false, kOtherUser, false, "-wal is a link"},
-    {"Dirorodiv/HotFolders.db-shm", false, false, kOtherUser, false, "-shm is a link"},
-    {"Dirorodiv/HotFolders.db-journal", false, false, kOtherUser, false, "-journal is a link"},
-    {"Dirorodiv", true, true, kOtherUser, false, "Dirorodiv is a link owned by another user"},
-    {"", true, true, kOtherUser, false, "KYR is a link owned by another user"},
-    {"Dirorodiv", true, true, 0, true, nullptr},
-};
-
 TEST(Links, NothingWrittenThroughAnotherUsersLink) {
   if (geteuid() != 0) GTEST_SKIP() << "planting another user's link needs root";
-  for (const Row& row : kRows) {
-    SCOPED_TRACE(std::string("KYR/") + row.at + (row.owner ? " of another user" : " of our own"));
+  const std::vector<CaseRow> rows = ReadCases("tests/link_cases.tsv");
+  ASSERT_FALSE(rows.empty());
+  for (const CaseRow& row : rows) {
+    const bool directory = row.at(1) == "dir", migrated = row.at(3) == "migrated";
+    const uid_t owner = row.at(2) == "own" ? 0 : kOtherUser;
+    const std::string refusal = row.size() > 4 ? row[4] : "";
+    SCOPED_TRACE("KYR/" + row[0] + " of " + row[2]);
     TempPrefix prefix;
     const fs::path kyr = prefix.Drive('c') / "ProgramData/KYR";
     const fs::path outside = prefix.root() / "outside", target = outside / "target";
-    const fs::path at = *row.at ? kyr / row.at : kyr;
+    const fs::path at = row[0].empty() ? kyr : kyr / row[0];
     // D:\Jobs\A is listed; D:\Jobs\X was retired by someone, and the record
     // behind a link names it as this tool's.
     WriteLegacyList(prefix, {{"D:\\Jobs\\A", 2}});
     WriteFolderConfig(prefix, "Jobs/A", "<r/>");
     prefix.WriteFile(OnDriveD(prefix, "Jobs/X/[_KYR_HotFolder_Old]/folder.cfg"), "<r/>");
     fs::create_directories(outside);
-    if (row.directory) {
+    if (directory) {
       fs::create_directories(kyr / "Dirorodiv");
       fs::rename(at, target);
-    } else if (row.target_exists) {
+    } else if (row[1] == "record") {
       prefix.WriteFile(target, EncodeRunRecord({{"D:\\Jobs\\X", true}}));
     }
     fs::create_directories(at.parent_path());
     fs::create_symlink(target, at);
-    ASSERT_EQ(lchown(at.c_str(), row.owner, row.owner), 0);
+    ASSERT_EQ(lchown(at.c_str(), owner, owner), 0);
     const Tree outside_before = Snapshot(outside), drive_before = Snapshot(prefix.Drive('d'));
 
     CHFMigrator engine;
     engine.Run();
 
     const Tree retired = Retired(drive_before, {"Jobs/A/[_KYR_HotFolder_]"});
-    EXPECT_EQ(Snapshot(prefix.Drive('d')) == retired, row.migrated);
-    EXPECT_EQ(Snapshot(prefix.Drive('d')) == drive_before, !row.migrated);
-    EXPECT_EQ(Snapshot(outside) == outside_before, row.owner != 0);
+    EXPECT_EQ(Snapshot(prefix.Drive('d')) == retired, migrated);
+    EXPECT_EQ(Snapshot(prefix.Drive('d')) == drive_before, !migrated);
+    EXPECT_EQ(Snapshot(outside) == outside_before, owner != 0);
     for (const char* command : {"list", "check"}) {
       const CapturedRun run = RunCaptured(BinDir() + "/hfstore", {command});
-      EXPECT_EQ(run.status, row.refusal ? 1 : 0) << command << run.err;
-      EXPECT_NE(run.err.find(row.refusal ? row.refusal : ""), std::string::npos) << run.err;
+      EXPECT_EQ(run.status, refusal.empty() ? 0 : 1) << command << run.err;
+      EXPECT_NE(run.err.find(refusal), std::string::npos) << run.err;
     }
     EXPECT_EQ(RunCaptured(BinDir() + "/hfstore", {"list"}).out,
-              row.migrated ? "enabled\tA\tD:\\Jobs\\A\tPDF > PS > TIFF > VDP\n" : "");
+              migrated ? "enabled\tA\tD:\\Jobs\\A\tPDF > PS > TIFF > VDP\n" : "");
   }
 }
 
