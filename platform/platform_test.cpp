@@ -217,6 +217,13 @@ TEST(NetworkTest, ResolvesTheLocalHost) {
 }
 
 #ifndef _WIN32
+// A table's Windows path, its bytes read as Latin-1.
+std::wstring Wide(const std::string& latin1) {
+  std::wstring wide;
+  for (const unsigned char c : latin1) wide += c;
+  return wide;
+}
+
 // POSIX host: the Wine-style prefix mapping, the rows of prefix_paths.tsv.
 TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
   TempPrefix prefix;
@@ -229,7 +236,7 @@ TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
   const std::vector<CaseRow> cases = ReadCases("platform/prefix_paths.tsv");
   ASSERT_FALSE(cases.empty());
   for (const CaseRow& c : cases) {
-    const std::wstring windows(c.at(1).begin(), c.at(1).end());  // ASCII
+    const std::wstring windows = Wide(c.at(1));
     if (c[0] == "to") {
       EXPECT_EQ(platform::ToHostPath(windows), host(c.at(2))) << c[1];
     } else {
@@ -247,45 +254,36 @@ TEST(PrefixTest, MapsWindowsPathsBothWaysAndNeverCreatesADrive) {
             Environment("HOME") + "/.wine/dosdevices/c:/hf-none");
 }
 
-// POSIX host: processes listed in ascending id order. kill() reads 0 as "my
-// process group"; such ids are refused. That check runs in a child with a
-// group of its own, so a failure ends only that.
 // A folder is reached only through links of root's or the running user's,
-// those inside a link's target included, and named with none left in it.
+// those inside a link's target included, and named with none left in it: the
+// rows of trusted_folders.tsv.
 TEST(PrefixTest, TrustedFoldersFollowOnlyTrustedLinks) {
   if (geteuid() != 0) GTEST_SKIP() << "planting another user's link needs root";
   TempPrefix prefix;
   const fs::path d = prefix.Drive('d');
   fs::create_directories(d / "real/sub");
-  const std::tuple<const char*, const char*, uid_t> links[] = {{"foreign", "real", 65534},
-                                                               {"own", "real", 0},
-                                                               {"via", "foreign/sub", 0},
-                                                               {"up", "../drive_d/own", 0},
-                                                               {"file", "real/file", 0}};
   prefix.WriteFile(d / "real/file", "");
-  for (const auto& [name, target, owner] : links) {
-    fs::create_symlink(target, d / name);
-    ASSERT_EQ(lchown((d / name).c_str(), owner, owner), 0);
-  }
-  using T = platform::FolderTrust;
-  const std::tuple<const wchar_t*, bool, T, std::string> cases[] = {
-      {L"D:\\own\\sub", false, T::kTrusted, "real/sub"},
-      {L"D:\\up\\sub\\new\\er", true, T::kTrusted, "real/sub/new/er"},
-      {L"D:\\foreign\\sub", false, T::kForeignLink, "foreign"},
-      {L"D:\\via", true, T::kForeignLink, "foreign"},
-      {L"D:\\own\\none", false, T::kMissing, "real/none"},
-      {L"D:\\file\\x", true, T::kNotADirectory, "real/file"},
-      {L"Q:\\x", true, T::kMissing, "../dosdevices/q:"},  // a drive is never made
-  };
+  const char* kTrust[] = {"trusted", "missing", "foreign link", "not a directory", "failed"};
   const std::string drive = fs::canonical(d).string() + "/";
-  for (const auto& [path, create, trust, where] : cases) {
-    const platform::TrustedFolder folder = platform::OpenTrustedFolder(path, create);
-    EXPECT_EQ(folder.trust, trust) << fs::path(path);
-    EXPECT_EQ(folder.path, fs::path(drive + where).lexically_normal().string()) << fs::path(path);
+  const std::vector<CaseRow> cases = ReadCases("platform/trusted_folders.tsv");
+  ASSERT_FALSE(cases.empty());
+  for (const CaseRow& c : cases) {
+    if (c.at(0) == "link") {
+      fs::create_symlink(c.at(2), d / c.at(1));
+      ASSERT_EQ(lchown((d / c[1]).c_str(), std::stoi(c.at(3)), std::stoi(c[3])), 0);
+      continue;
+    }
+    const platform::TrustedFolder folder =
+        platform::OpenTrustedFolder(Wide(c.at(1)), !c.at(2).empty());
+    EXPECT_EQ(kTrust[static_cast<int>(folder.trust)], c.at(3)) << c[1];
+    EXPECT_EQ(folder.path, fs::path(drive + c.at(4)).lexically_normal().string()) << c[1];
   }
   EXPECT_FALSE(fs::exists(d / "real/none") || fs::exists(prefix.root() / "dosdevices/q:"));
 }
 
+// POSIX host: processes listed in ascending id order. kill() reads 0 as "my
+// process group"; such ids are refused. That check runs in a child with a
+// group of its own, so a failure ends only that.
 TEST(ProcessTest, ListsByIdAndRefusesProcessGroupIds) {
   std::vector<platform::ProcessId> ids;
   ASSERT_TRUE(platform::EnumerateProcesses(&ids));
@@ -301,28 +299,13 @@ TEST(ProcessTest, ListsByIdAndRefusesProcessGroupIds) {
 // POSIX host: HKEY_LOCAL_MACHINE is the prefix's system.reg.
 TEST(RegistryTest, ReadsTheWineSystemHive) {
   TempPrefix prefix;
-  const std::wstring product = L"SOFTWARE\\Wow6432Node\\Tessaly Systems\\Corvane_app\\3.0";
-  EXPECT_FALSE(platform::HklmKeyOpensForRead(product));  // no hive at all
+  EXPECT_FALSE(platform::HklmKeyOpensForRead(L"SOFTWARE\\Vendor\\App\\3.01"));  // no hive at all
   prefix.WriteFile(prefix.root() / "system.reg",
-                   "WINE REGISTRY Version 2\n"
-                   ";; All keys relative to \\\\Machine\n\n#arch=win64\n\n"
-                   "[Software\\\\Wow6432Node\\\\Tessaly Systems\\\\Corvane_app\\\\3.0\\\\Paths] "
-                   "1700000000\n#time=1d9a0b2c3d4e5f6\n\"Dir\"=\"C:\\\\x\"\n\n"
-                   "[Software\\\\Vendor\\\\App\\\\3.01] 1700000000\n"
-                   "[Software\\\\Vendor\\\\Br\\[ack\\]et\\x00fc] 1700000000\n"
-                   "[Software\\\\Unclosed\n");
-  const std::pair<std::wstring, bool> cases[] = {
-      {product, true},  // a parent of a section
-      {L"software\\wow6432node\\TESSALY SYSTEMS\\corvane_app\\3.0\\paths", true},
-      {L"SOFTWARE\\Wow6432Node\\Tessaly Systems\\Corvane_app\\3", false},
-      {L"SOFTWARE\\Vendor\\App\\3.0", false},  // only a sibling "3.01"
-      {L"SOFTWARE\\Vendor\\App\\3.01\\Below", false},
-      {L"SOFTWARE\\Vendor\\Br[ack]et\u00dc", true},  // escapes, and case beyond ASCII
-      {L"SOFTWARE\\Unclosed", false},
-      {L"SOFTWARE\\Missing", false},
-  };
-  for (const auto& [key, opens] : cases)
-    EXPECT_EQ(platform::HklmKeyOpensForRead(key), opens) << key;
+                   TempPrefix::ReadFile(HF_SOURCE_DIR "/platform/registry_system.reg"));
+  const std::vector<CaseRow> cases = ReadCases("platform/registry_cases.tsv");
+  ASSERT_FALSE(cases.empty());
+  for (const CaseRow& c : cases)
+    EXPECT_EQ(platform::HklmKeyOpensForRead(Wide(c.at(0))), c.at(1) == "1") << c[0];
 }
 #endif
 
