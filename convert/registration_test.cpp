@@ -7,12 +7,12 @@
 #include <filesystem>
 #include <optional>
 #include <string>
-#include <tuple>
 
 #include "convert/host_resolver.h"
 #include "convert/server_lookup.h"
 #include "engine/migrator.h"
 #include "store/store_reader.h"
+#include "tests/cases.h"
 #include "tests/run_program.h"
 #include "tests/temp_prefix.h"
 
@@ -23,50 +23,33 @@ using namespace platform;
 
 const std::uint32_t kRo = kAttributeReadOnly, kSys = kAttributeSystem, kHid = kAttributeHidden;
 
-// What the faked name services answer (sockets start, the local name and the
-// host entry; null: none), the address asked, the outcome (null: unresolved,
-// name unchanged) and the queries made.
-using ResolveCase =
-    std::tuple<bool, const char*, const char*, const wchar_t*, const char*, const char*>;
-const ResolveCase* g_case;
+// A row of convert/resolve_cases.tsv: what the faked name services answer.
+const CaseRow* g_case;
 std::string g_queries;
 
-template <int kAnswer>
-bool Answer(const std::string& query, std::string* name) {
-  const char* answer = std::get<kAnswer>(*g_case);
+bool Answer(int column, const std::string& query, std::string* name) {
+  const std::string& answer = g_case->at(column);
   g_queries += query + ";";
-  if (answer) *name = answer;
-  return answer != nullptr;
+  if (answer != "-") *name = answer;
+  return answer != "-";
 }
 
 const HostResolver kFakeResolver = {
-    [] { return std::get<0>(*g_case); },
-    [](std::string* name) { return Answer<1>("local", name); },
-    [](const std::string& q, std::string* name) { return Answer<2>("name:" + q, name); },
-    [](const std::string& q, std::string* name) { return Answer<2>("addr:" + q, name); },
+    [] { return g_case->at(0) == "yes"; },
+    [](std::string* name) { return Answer(1, "local", name); },
+    [](const std::string& q, std::string* name) { return Answer(2, "name:" + q, name); },
+    [](const std::string& q, std::string* name) { return Answer(2, "addr:" + q, name); },
 };
 
 TEST(ResolveServerName, DispatchAndShortName) {
-  const ResolveCase cases[] = {
-      {true, "build7.lab.example", "x", L"LOCALHOST", "build7.lab.example", "local;"},
-      {true, "build7.lab.example", "x", L"127.0.0.1", "build7.lab.example", "local;"},
-      {true, nullptr, "localhost.localdomain", L"localhost", "localhost", "local;name:localhost;"},
-      {true, nullptr, "spool.corp.example.com", L"spool", "spool", "name:spool;"},
-      {true, nullptr, "spool01.example", L"10.1.2.3", "spool01", "addr:10.1.2.3;"},
-      {true, nullptr, nullptr, L"10.1.2.4", nullptr, "addr:10.1.2.4;"},
-      {true, nullptr, "somewhere", L"", nullptr, ""},
-      {false, "build7", "x", L"localhost", nullptr, ""},
-      // U+0141 must not become 'A' (0x41) and name another host.
-      {true, nullptr, nullptr, L"\u0141odz", nullptr, "addr:?odz;"},
-  };
   UseHostResolver(&kFakeResolver);
-  for (const ResolveCase& c : cases) {
-    const auto& [sockets, local, remote, address, resolved, queries] = c;
+  for (const CaseRow& c : ReadCases("convert/resolve_cases.tsv")) {
     g_case = &c;
     g_queries.clear();
     wxString name = "legacy";
-    EXPECT_EQ(ResolveServerName(address, name), resolved != nullptr) << wxString(address);
-    EXPECT_EQ(name + " " + g_queries, wxString(resolved ? resolved : "legacy") + " " + queries);
+    const bool resolved = c[4] != "-";
+    EXPECT_EQ(ResolveServerName(wxString::FromUTF8(c[3]), name), resolved) << c[3];
+    EXPECT_EQ(name + " " + g_queries, wxString::FromUTF8(resolved ? c[4] : "legacy") + " " + c[5]);
   }
   UseHostResolver(nullptr);
 }
@@ -96,7 +79,7 @@ TEST(Registration, RetiringAndRefusal) {
       {kGood, false, kRo, 0, 5, std::string(100, 'L') + "/" + std::string(200, 'M')},
       {kGood, false, kRo, 0, 1000, ""},  // never free: registered all the same
   };
-  const ResolveCase local = {true, "build7.lab.example", nullptr, L"", nullptr, nullptr};
+  const CaseRow local = {"yes", "build7.lab.example", "-", "", "-", "-"};
   g_case = &local;
   UseHostResolver(&kFakeResolver);
   for (const auto& c : cases) {

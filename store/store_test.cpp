@@ -10,8 +10,8 @@
 
 #include "store/record_fields.h"
 #include "store/schema.h"
-#include "store/store.h"
-#include "tests/run_program.h"
+#include "store/store_reader.h"
+#include "tests/hot_folder.h"
 #include "tests/temp_prefix.h"
 
 namespace {
@@ -19,38 +19,16 @@ namespace {
 namespace fs = std::filesystem;
 using nlohmann::json;
 
-const auto W = [](const char* utf8) { return wxString::FromUTF8(utf8); };
-
-fs::path StoreFile(const TempPrefix& prefix) {
-  return prefix.Drive('c') / "ProgramData" / "KYR" / "Dirorodiv" / "HotFolders.db";
+fs::path StoreFile() {
+  return StoreHostPath();
 }
-
-// The six records of one hot folder.
-struct Folder {
-  db::Setting setting;
-  db::FolderConfiguration folder;
-  db::JobConfiguration job;
-  db::FilterConfiguration filter;
-  db::ImposeConfiguration impose;
-  db::PreflightConfiguration preflight;
-
-  explicit Folder(const wxString& path) { setting.FolderPath = folder.FolderPath = path; }
-  long Create() {
-    return RODuriZudaze::GetInstance().CreateHotFolder(setting, folder, job, filter, impose,
-                                                       preflight);
-  }
-};
 
 const auto Disable = [](const char* path) {
   return RODuriZudaze::GetInstance().DisableHotFolder(path);
 };
 
-CapturedRun Hfstore(const std::vector<std::string>& args) {
-  return RunCaptured(BinDir() + "/hfstore", args);
-}
-
 json Dump() {
-  CapturedRun run = Hfstore({"dump"});
+  RunResult run = Hfstore({"dump"});
   EXPECT_EQ(run.status, 0) << run.err;
   return json::parse(run.out, nullptr, /*allow_exceptions=*/false);
 }
@@ -122,7 +100,7 @@ TEST(Store, FirstLayoutIsReadAndWrittenAsItStands) {
   TempPrefix prefix;
   std::string sql = db::CreateSchemaSql();
   for (size_t at; (at = sql.find(" WITHOUT ROWID")) != std::string::npos;) sql.erase(at, 14);
-  WriteSqlite(StoreFile(prefix), (sql + "PRAGMA user_version = 1;").c_str());
+  WriteSqlite(StoreFile(), (sql + "PRAGMA user_version = 1;").c_str());
   ASSERT_NE(Folder("D:\\Jobs\\A").Create(), 0);
   EXPECT_TRUE(Disable("D:\\Jobs\\A"));
   EXPECT_EQ(Hfstore({"list"}).out, "disabled\t\tD:\\Jobs\\A\t\n");
@@ -144,7 +122,7 @@ TEST(Store, RefusedFileStaysUnchanged) {
   for (const auto& c : cases) {
     SCOPED_TRACE(c.what);
     TempPrefix prefix;
-    const fs::path file = StoreFile(prefix);
+    const fs::path file = StoreFile();
     if (!c.sql) prefix.WriteFile(file, std::string("not a database\n\0\x01", 17));
     if (c.sql) WriteSqlite(file, c.sql);
     if (c.what[0] == 'd')  // page 2
@@ -152,7 +130,7 @@ TEST(Store, RefusedFileStaysUnchanged) {
     const std::string before = TempPrefix::ReadFile(file);
     EXPECT_EQ(Folder("D:\\Jobs\\A").Create(), 0);
     EXPECT_FALSE(Disable("D:\\Jobs\\A"));
-    CapturedRun run = Hfstore({"list"});
+    RunResult run = Hfstore({"list"});
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(std::count(run.err.begin(), run.err.end(), '\n'), 1) << run.err;
     EXPECT_EQ(TempPrefix::ReadFile(file), before);
@@ -172,7 +150,7 @@ TEST(Store, UnwritableOrLockedLocationFailsUntilFreed) {
   ASSERT_NE(folder.Create(), 0);
 
   sqlite3* other = nullptr;
-  ASSERT_EQ(sqlite3_open(StoreFile(prefix).c_str(), &other), SQLITE_OK);
+  ASSERT_EQ(sqlite3_open(StoreFile().c_str(), &other), SQLITE_OK);
   ASSERT_EQ(sqlite3_exec(other, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr), SQLITE_OK);
   Folder blocked("D:\\Jobs\\B");
   EXPECT_EQ(blocked.Create(), 0);  // after the busy timeout
@@ -182,7 +160,7 @@ TEST(Store, UnwritableOrLockedLocationFailsUntilFreed) {
 
 TEST(Hfstore, ExitStatusAndMessages) {
   TempPrefix prefix;
-  CapturedRun missing = Hfstore({"list"});
+  RunResult missing = Hfstore({"list"});
   EXPECT_EQ(missing.status, 1);
   EXPECT_NE(missing.err.find("no store at"), std::string::npos) << missing.err;
   EXPECT_FALSE(fs::exists(prefix.Drive('c') / "ProgramData"));  // created nothing
@@ -204,8 +182,8 @@ TEST(Hfstore, ExitStatusAndMessages) {
     std::string err;  // a part of standard error
   } cases[] = {
       {{"list"}, 0, "disabled\tBro chures\tD:\\Jobs\\Brochures\tPDF > 1-Bit TIFF\n", ""},
-      {{"list", "--store", StoreFile(prefix).string()}, 0, "disabled\tBro chures\t...", ""},
-      {{"dump", "--store=" + StoreFile(prefix).string()}, 0, "{\n  \"hotFolders\": [...", ""},
+      {{"list", "--store", StoreFile().string()}, 0, "disabled\tBro chures\t...", ""},
+      {{"dump", "--store=" + StoreFile().string()}, 0, "{\n  \"hotFolders\": [...", ""},
       {{"--help"}, 0, "...", ""},
       {{"list", "--store", (prefix.root() / "none.db").string()}, 1, "", "none.db"},
       {{}, 2, "", "required"},
@@ -215,7 +193,7 @@ TEST(Hfstore, ExitStatusAndMessages) {
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(c.args.empty() ? "(none)" : c.args[0]);
-    CapturedRun run = Hfstore(c.args);
+    RunResult run = Hfstore(c.args);
     EXPECT_EQ(run.status, c.status) << run.err;
     const std::size_t dots = c.out.rfind("...");
     const bool start_only = dots != std::string::npos && dots + 3 == c.out.size();
@@ -228,7 +206,7 @@ TEST(Hfstore, ExitStatusAndMessages) {
   // files behind, which a writer of another user might not be able to open.
   RODuriZudaze::GetInstance().Close();
   EXPECT_EQ(Hfstore({"list"}).status, 0);
-  EXPECT_EQ(std::distance(fs::directory_iterator(StoreFile(prefix).parent_path()), {}), 1);
+  EXPECT_EQ(std::distance(fs::directory_iterator(StoreFile().parent_path()), {}), 1);
   std::string help = Hfstore({"--help"}).out;
   for (const char* word : {"list", "dump", "--store", "tab", "JSON", "Exit status"}) {
     EXPECT_NE(help.find(word), std::string::npos) << word;

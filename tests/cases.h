@@ -5,6 +5,7 @@
 #define HF_TESTS_CASES_H_
 
 #include <fstream>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -27,6 +28,7 @@ inline std::string Unescape(const std::string& text) {
 // The rows of a case file in the source tree, such as "convert/impose_cases.tsv".
 inline std::vector<CaseRow> ReadCases(const std::string& file) {
   std::ifstream in(std::string(HF_SOURCE_DIR) + "/" + file);
+  if (!in) throw std::runtime_error("cannot read " + file);
   std::vector<CaseRow> rows;
   for (std::string line; std::getline(in, line);) {
     if (line.empty() || line[0] == '#') continue;

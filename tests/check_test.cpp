@@ -6,86 +6,56 @@
 
 #include "engine/migrator.h"
 #include "engine/run_record.h"
-#include "store/store.h"
 #include "store/store_reader.h"
+#include "tests/cases.h"
+#include "tests/hot_folder.h"
 #include "tests/legacy_fixture.h"
-#include "tests/run_program.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 
-// One listed folder D:\Jobs\<name>: how it is listed, stored and left on disk.
+// One listed folder D:\Jobs\<name>: how it is listed, stored and left on
+// disk (tests/check_cases.tsv).
 struct Row {
-  const char* name;
+  std::string name;
   bool listed_enabled;
   int stored;     // -1: not stored, else the stored enabled state
   bool config;    // [_KYR_HotFolder_]\folder.cfg
   bool retired;   // [_KYR_HotFolder_Old]
   bool recorded;  // in the record of an interrupted run that was retiring it
-  const char* line;
+  bool passes = true;
+  std::string line = "";
 };
 
-const Row kRows[] = {
-    {"A", true, 1, false, true, false, "migrated\tD:\\Jobs\\A\tenabled, as listed"},
-    {"B", false, 0, false, true, false, "migrated\tD:\\Jobs\\B\tdisabled, as listed"},
-    {"C", true, -1, false, false, false,
-     "not migrated\tD:\\Jobs\\C\tno folder.cfg at D:\\Jobs\\C\\[_KYR_HotFolder_]\\folder.cfg"},
-    {"D", true, -1, false, true, false,  // retired by someone else
-     "not migrated\tD:\\Jobs\\D\tno folder.cfg at D:\\Jobs\\D\\[_KYR_HotFolder_]\\folder.cfg; "
-     "D:\\Jobs\\D\\[_KYR_HotFolder_Old] is left alone: no interrupted run retired it"},
-    // The list allows tabs and line feeds in a path: such a field is written
-    // as its JSON string, so the line keeps its three fields.
-    {"T\tab\nLF", true, -1, false, false, false,
-     "not migrated\t\"D:\\\\Jobs\\\\T\\tab\\nLF\"\t\"no folder.cfg at "
-     "D:\\\\Jobs\\\\T\\tab\\nLF\\\\[_KYR_HotFolder_]\\\\folder.cfg\""},
-    {"E", true, -1, true, false, false,
-     "not migrated\tD:\\Jobs\\E\tnot registered; its settings are still at "
-     "D:\\Jobs\\E\\[_KYR_HotFolder_]\\folder.cfg"},
-    {"F", true, -1, false, true, true,
-     "interrupted\tD:\\Jobs\\F\tsettings retired but not registered: run hfmigrate again"},
-    {"G", false, 1, false, true, false,
-     "enabled state differs\tD:\\Jobs\\G\tlisted disabled, stored enabled"},
-    {"H", true, 1, true, false, false,
-     "settings not retired\tD:\\Jobs\\H\tregistered, but its settings are still at "
-     "D:\\Jobs\\H\\[_KYR_HotFolder_]\\folder.cfg: run hfmigrate again"},
-    // Not UTF-8, the machine's ANSI code page here: named by its bytes.
-    {"Caf\xE9", true, -1, true, false, false,
-     "path not decodable\tD:\\Jobs\\Caf\\xE9\tthe list's bytes for this path do not decode in "
-     "this machine's ANSI code page: hfmigrate cannot find the folder"},
-    {"I", true, 1, true, true, false,
-     "settings not retired\tD:\\Jobs\\I\tregistered, but its settings are still at "
-     "D:\\Jobs\\I\\[_KYR_HotFolder_]\\folder.cfg: D:\\Jobs\\I\\[_KYR_HotFolder_Old] already "
-     "exists"},
-};
-constexpr int kAsListed = 5;  // the first rows: a run that went well
-
-std::string Path(const Row& row) {
-  return std::string("D:\\Jobs\\") + row.name;
+std::vector<Row> Rows() {
+  std::vector<Row> rows;
+  for (const CaseRow& c : ReadCases("tests/check_cases.tsv")) {
+    rows.push_back({c[0], c[1] == "enabled", c[2] == "-" ? -1 : c[2] == "enabled",
+                    c[3].find("cfg") != std::string::npos, c[3].find("Old") != std::string::npos,
+                    c[4] == "recorded", c[5] == "pass", c[6] + "\t" + c[7] + "\t" + c[8]});
+  }
+  return rows;
 }
 
-void Lay(const TempPrefix& prefix, const Row* rows, int count) {
+std::string Path(const Row& row) {
+  return "D:\\Jobs\\" + row.name;
+}
+
+void Lay(const TempPrefix& prefix, const std::vector<Row>& rows) {
   UseUtf8AnsiCodePage(prefix);
   std::vector<LegacyFolder> list;
   std::vector<RunRecordEntry> record;
-  for (const Row* row = rows; row != rows + count; ++row) {
-    list.push_back({Path(*row), static_cast<std::uint16_t>(row->listed_enabled ? 2 : 0)});
-    const fs::path dir = OnDriveD(prefix, std::string("Jobs/") + row->name);
+  for (const Row& row : rows) {
+    list.push_back({Path(row), static_cast<std::uint16_t>(row.listed_enabled ? 2 : 0)});
+    const fs::path dir = OnDriveD(prefix, "Jobs/" + row.name);
     fs::create_directories(dir);
-    if (row->config) prefix.WriteFile(dir / "[_KYR_HotFolder_]" / "folder.cfg", "<r/>");
-    if (row->retired) prefix.WriteFile(dir / "[_KYR_HotFolder_Old]" / "folder.cfg", "<r/>");
-    if (row->recorded) record.push_back({Path(*row), true});
-    if (row->stored < 0) continue;
-    db::Setting setting;
-    setting.FolderPath = Path(*row);
-    db::FolderConfiguration folder;
-    db::JobConfiguration job;
-    db::FilterConfiguration filter;
-    db::ImposeConfiguration impose;
-    db::PreflightConfiguration preflight;
-    RODuriZudaze& store = RODuriZudaze::GetInstance();
-    if (row->stored == 0) store.CreateNextDisabled(setting.FolderPath);
-    ASSERT_NE(store.CreateHotFolder(setting, folder, job, filter, impose, preflight), 0);
+    if (row.config) prefix.WriteFile(dir / "[_KYR_HotFolder_]" / "folder.cfg", "<r/>");
+    if (row.retired) prefix.WriteFile(dir / "[_KYR_HotFolder_Old]" / "folder.cfg", "<r/>");
+    if (row.recorded) record.push_back({Path(row), true});
+    if (row.stored < 0) continue;
+    if (row.stored == 0) RODuriZudaze::GetInstance().CreateNextDisabled(Path(row));
+    ASSERT_NE(Folder(Path(row)).Create(), 0);
   }
   WriteLegacyList(prefix, list);
   if (!record.empty()) {
@@ -93,20 +63,17 @@ void Lay(const TempPrefix& prefix, const Row* rows, int count) {
   }
 }
 
-CapturedRun Hfstore(const std::vector<std::string>& args) {
-  return RunCaptured(BinDir() + "/hfstore", args);
-}
-
 TEST(Check, EachKindOfFolderAndTheExitStatus) {
   TempPrefix prefix;
-  Lay(prefix, kRows, std::size(kRows));
+  const std::vector<Row> rows = Rows();
+  Lay(prefix, rows);
   std::string expected;
-  for (const Row& row : kRows) expected += std::string(row.line) + "\n";
+  for (const Row& row : rows) expected += row.line + "\n";
   expected +=
       "11 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
       " 2 settings not retired, 1 path not decodable; not every folder with legacy settings is"
       " migrated as listed\n";
-  CapturedRun run = Hfstore({"check"});
+  RunResult run = Hfstore({"check"});
   EXPECT_EQ(run.status, 1) << run.err;
   EXPECT_EQ(run.out, expected);
 
@@ -129,16 +96,21 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
 // A run that went well exits 0; any one folder with legacy settings that is
 // not migrated as listed makes it 1 on its own.
 TEST(Check, ExitStatusOfEachKindAlone) {
-  for (int odd = kAsListed - 1; odd < static_cast<int>(std::size(kRows)); ++odd) {
-    std::vector<Row> rows(kRows, kRows + kAsListed - 1);
-    rows.push_back(kRows[odd]);
+  const std::vector<Row> all = Rows();
+  std::vector<Row> passing;
+  for (const Row& row : all) {
+    if (row.passes) passing.push_back(row);
+  }
+  for (const Row& odd : all) {
+    if (odd.passes && &odd != &all[0]) continue;  // once with the passing rows alone
+    std::vector<Row> rows = passing;
+    if (!odd.passes) rows.push_back(odd);
     SCOPED_TRACE(rows.back().line);
     TempPrefix prefix;
-    Lay(prefix, rows.data(), static_cast<int>(rows.size()));
-    const bool counts = odd >= kAsListed;
-    CapturedRun run = Hfstore({"check"});
-    EXPECT_EQ(run.status, counts ? 1 : 0) << run.out;
-    EXPECT_NE(run.out.find(counts ? "; not every" : "; every"), std::string::npos);
+    Lay(prefix, rows);
+    RunResult run = Hfstore({"check"});
+    EXPECT_EQ(run.status, odd.passes ? 0 : 1) << run.out;
+    EXPECT_NE(run.out.find(odd.passes ? "; every" : "; not every"), std::string::npos);
   }
 }
 
@@ -162,9 +134,7 @@ TEST(RunRecord, TrustedOnlyWhenWholeAndOurs) {
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);
     TempPrefix prefix;
-    const Row rows[] = {{"X", true, -1, false, true, false, ""},
-                        {"Y", true, -1, true, false, false, ""}};
-    Lay(prefix, rows, 2);
+    Lay(prefix, {{"X", true, -1, false, true, false}, {"Y", true, -1, true, false, false}});
     const fs::path record = prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run";
     prefix.WriteFile(record, c.record);
     CHFMigrator engine;
@@ -187,9 +157,7 @@ TEST(RunRecord, TrustedOnlyWhenWholeAndOurs) {
 // that the next run, with the store mended, puts X back and migrates it.
 TEST(RunRecord, KeptWhileAFolderIsUndecided) {
   TempPrefix prefix;
-  const Row rows[] = {{"X", true, -1, true, false, false, ""},
-                      {"Y", true, -1, true, false, false, ""}};
-  Lay(prefix, rows, 2);
+  Lay(prefix, {{"X", true, -1, true, false, false}, {"Y", true, -1, true, false, false}});
   const fs::path record = prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run";
   prefix.WriteFile(fs::path(StoreHostPath()), std::string(4096, 'x'));
   platform::FailNextMoves(1, platform::MoveOutcome::kFailed, /*skip=*/1);
@@ -203,7 +171,7 @@ TEST(RunRecord, KeptWhileAFolderIsUndecided) {
   RODuriZudaze::GetInstance().Close();
   fs::remove(StoreHostPath());
   CHFMigrator().Run();
-  CapturedRun run = Hfstore({"check"});
+  RunResult run = Hfstore({"check"});
   EXPECT_EQ(run.status, 0) << run.out;
   EXPECT_FALSE(fs::exists(record));
 }

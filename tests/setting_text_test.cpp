@@ -9,45 +9,29 @@
 #include <vector>
 
 #include "engine/migrator.h"
+#include "tests/cases.h"
+#include "tests/hot_folder.h"
 #include "tests/legacy_fixture.h"
-#include "tests/run_program.h"
-#include "tests/temp_prefix.h"
 
 namespace {
 
-const std::string kPdf2Ps = "<FILTERID>{CDD70909-DACE-499B-9186-B6088CD46376}\n";
-
-// Each text whole as XML gives it: the pieces the parser splits it into
-// (at line ends and references) all count, blank ones included. A folder is
-// summed up as its filter chain, "|", and its job settings as "name=value;";
-// "*" stands for the default chain.
+// Setting texts as written (tests/setting_text_cases.tsv): body, summary.
 TEST(SettingText, TakenWholeAsWritten) {
-  const std::pair<std::string, std::string> cases[] = {
-      {"<DriverSettings><K>\n  value</K></DriverSettings>", "*|K=\n  value;"},
-      {"<DriverSettings><K>   &amp; B</K></DriverSettings>", "*|K=   & B;"},
-      {"<DriverSettings><K> &#65;</K></DriverSettings>", "*|K= A;"},
-      {"<DriverSettings><K>\r\nCRLF</K></DriverSettings>", "*|K=\nCRLF;"},
-      {"<DriverSettings><K> \r\n\t </K></DriverSettings>", "*|"},
-      {"<DriverSettings><K><?pi x?><!--x-->v</K></DriverSettings>", "*|K=v;"},
-      {kPdf2Ps + "<Name/><Enabled>1</Enabled></FILTERID>", "PDF;|"},
-      {"<FILTERID>\n" + kPdf2Ps.substr(10) + "<Name/><Enabled>1</Enabled></FILTERID>", "*|"},
-      {kPdf2Ps + "<Name/><Enabled>\n1</Enabled></FILTERID>", "*|"},
-      {kPdf2Ps + "<Name/><Enabled> &#49;</Enabled></FILTERID>", "*|"},
-  };
+  const std::vector<CaseRow> cases = ReadCases("tests/setting_text_cases.tsv");
   TempPrefix prefix;
   std::vector<LegacyFolder> listed;
-  for (const auto& [body, summary] : cases) {
+  for (const CaseRow& c : cases) {
     const std::string name = "F" + std::to_string(listed.size());
     WriteFolderConfig(prefix, name,
-                      "<HotFolderConfiguration>\n" + body + "\n</HotFolderConfiguration>");
+                      "<HotFolderConfiguration>\n" + c[0] + "\n</HotFolderConfiguration>");
     listed.push_back({"D:\\" + name, 2});
   }
   WriteLegacyList(prefix, listed);
   CHFMigrator().Run();
 
-  CapturedRun run = RunCaptured(BinDir() + "/hfstore", {"dump"});
+  RunResult run = Hfstore({"dump"});
   const auto folders = nlohmann::json::parse(run.out, nullptr, false)["hotFolders"];
-  ASSERT_EQ(folders.size(), std::size(cases)) << run.err;
+  ASSERT_EQ(folders.size(), cases.size()) << run.err;
   for (std::size_t i = 0; i < folders.size(); ++i) {
     std::string summary;
     for (const auto& filter : folders[i]["setting"]["Filters"])
@@ -56,7 +40,7 @@ TEST(SettingText, TakenWholeAsWritten) {
     for (const auto& entry : folders[i]["jobConfiguration"])
       summary += entry["Name"].get<std::string>() + "=" + entry["Value"].get<std::string>() + ";";
     if (summary.rfind("PDF;PS;TIFF;VDP;|", 0) == 0) summary.replace(0, 16, "*");
-    EXPECT_EQ(summary, cases[i].second) << cases[i].first;
+    EXPECT_EQ(summary, cases[i][1]) << cases[i][0];
   }
 }
 
