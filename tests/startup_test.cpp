@@ -51,32 +51,27 @@ bool Alive(platform::ProcessId id) {
   return platform::QueryProcessModule(id, &base_name, nullptr);
 }
 
-TEST(Startup, RunningServerIsNeitherWaitedForNorStopped) {
-  TempPrefix prefix;
-  CountingLauncher launcher(prefix);
-  RunningServer server;
-
-  // Arguments have no effect; the exit status is -1 whatever happens.
+// A running server is neither waited for nor stopped, and arguments have no
+// effect: the exit status is -1 whatever happens. Then the only slow part:
+// the fixed seven-second wait after launching. A second run meanwhile leaves
+// at once and changes nothing. The server launched hands over to another
+// process, which is found by name and stopped; a stand-in of another
+// installation, running before the launch, is left alone.
+TEST(Startup, ServerLaunchedOnlyWhenAbsentAwaitedAndStoppedOneRunAtATime) {
+  TempPrefix other;
+  CountingLauncher other_launcher(other);
+  const pid_t bystander = StartProgram(BinDir() + "/hotfolder.exe");
+  ASSERT_TRUE(WaitFor([] { return platform::NamedMutexExists(kServerMutex); }));
   RunResult run = RunProgram(BinDir() + "/hfmigrate", {"--help", "D:\\Jobs", "-v"});
   EXPECT_EQ(run.status, 255);
   EXPECT_LT(run.seconds, 5.0) << "no start-up wait when the server runs";
-  EXPECT_TRUE(Logged(prefix, "launches.log").empty());
+  EXPECT_TRUE(Logged(other, "launches.log").empty());
   EXPECT_TRUE(platform::NamedMutexExists(kServerMutex)) << "the running server was stopped";
-
   // A second stand-in finds the mutex taken and leaves at once.
-  RunResult second = RunProgram(BinDir() + "/hotfolder.exe");
-  EXPECT_EQ(second.status, 1);
-  EXPECT_LT(second.seconds, 5.0);
-}
+  RunResult second_server = RunProgram(BinDir() + "/hotfolder.exe");
+  EXPECT_EQ(second_server.status, 1);
+  EXPECT_LT(second_server.seconds, 5.0);
 
-// The only slow test: the fixed seven-second wait after launching. A second
-// run meanwhile leaves at once and changes nothing. The server launched hands
-// over to another process, which is found by name and stopped; a stand-in of
-// another installation, running before the launch, is left alone.
-TEST(Startup, AbsentServerIsLaunchedOnceAwaitedAndStoppedOneRunAtATime) {
-  TempPrefix other;
-  const pid_t bystander = StartProgram(BinDir() + "/hotfolder.exe");
-  ASSERT_TRUE(WaitFor([] { return platform::NamedMutexExists(kServerMutex); }));
   TempPrefix prefix;
   CountingLauncher launcher(prefix);
   WriteLegacyList(prefix, {{"D:\\Jobs\\A", 2}});
