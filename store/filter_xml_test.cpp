@@ -12,6 +12,8 @@
 #include <string>
 #include <vector>
 
+#include "tests/cases.h"
+
 namespace {
 
 // False when the library refuses to write the tree.
@@ -48,18 +50,13 @@ wxXmlNode* Setting(const wxXmlNode& tree) {
   return tree.GetChildren()->GetChildren()->GetChildren();
 }
 
+// The trees of filter_xml_cases.tsv, and trees no registration builds.
 TEST(FilterXml, WritesWhatTheXmlLibraryWrites) {
   wxInitializer init;
-  const char* settings[][3] = {
-      {"ERRORPATH", "C:\\Server", "KYR.PDF.1"},
-      {"FILENAMESTRUCTURE", "&lt;a&gt; &amp; \"b\" 'c' %J_%C.tif", "KYR.1BIT.1"},
-      {"V", "  two&#9;lines&#10;and&#13;&#10;a return  ", "KYR.PS.1"},
-      {"V", "x", "a&lt;b>&amp;&quot;c&quot;&#9;&#10;&#13;'d'"},  // markup, white space
-      {"MENU", "Caf\xC3\xA9 \xE2\x82\xAC \xF0\x9F\x98\x80", "KYR.PDF.1"},
-  };
   std::vector<std::pair<std::unique_ptr<wxXmlNode>, bool>> trees;  // and whether writable
-  for (auto& [key, value, id] : settings)
-    trees.emplace_back(Parsed(FilterTree(key, value, id)), true);
+  for (const CaseRow& c : ReadCases("store/filter_xml_cases.tsv"))
+    trees.emplace_back(Parsed(FilterTree(c.at(0), c.at(1), c.at(2))), true);
+  ASSERT_FALSE(trees.empty());
   trees.emplace_back(Parsed("<FilterSetting/>"), true);
   trees.emplace_back(Parsed("<FilterSetting><![CDATA[raw <cdata> & text]]><!-- a note -->"
                             "<?target data?></FilterSetting>"),
