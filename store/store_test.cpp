@@ -7,10 +7,12 @@
 #include <nlohmann/json.hpp>
 
 #include <algorithm>
+#include <sstream>
 
 #include "store/record_fields.h"
 #include "store/schema.h"
 #include "store/store_reader.h"
+#include "tests/cases.h"
 #include "tests/hot_folder.h"
 #include "tests/temp_prefix.h"
 
@@ -18,10 +20,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using nlohmann::json;
-
-fs::path StoreFile() {
-  return StoreHostPath();
-}
 
 const auto Disable = [](const char* path) {
   return RODuriZudaze::GetInstance().DisableHotFolder(path);
@@ -100,7 +98,7 @@ TEST(Store, FirstLayoutIsReadAndWrittenAsItStands) {
   TempPrefix prefix;
   std::string sql = db::CreateSchemaSql();
   for (size_t at; (at = sql.find(" WITHOUT ROWID")) != std::string::npos;) sql.erase(at, 14);
-  WriteSqlite(StoreFile(), (sql + "PRAGMA user_version = 1;").c_str());
+  WriteSqlite(StoreHostPath(), (sql + "PRAGMA user_version = 1;").c_str());
   ASSERT_NE(Folder("D:\\Jobs\\A").Create(), 0);
   EXPECT_TRUE(Disable("D:\\Jobs\\A"));
   EXPECT_EQ(Hfstore({"list"}).out, "disabled\t\tD:\\Jobs\\A\t\n");
@@ -122,7 +120,7 @@ TEST(Store, RefusedFileStaysUnchanged) {
   for (const auto& c : cases) {
     SCOPED_TRACE(c.what);
     TempPrefix prefix;
-    const fs::path file = StoreFile();
+    const fs::path file = StoreHostPath();
     if (!c.sql) prefix.WriteFile(file, std::string("not a database\n\0\x01", 17));
     if (c.sql) WriteSqlite(file, c.sql);
     if (c.what[0] == 'd')  // page 2
@@ -150,7 +148,7 @@ TEST(Store, UnwritableOrLockedLocationFailsUntilFreed) {
   ASSERT_NE(folder.Create(), 0);
 
   sqlite3* other = nullptr;
-  ASSERT_EQ(sqlite3_open(StoreFile().c_str(), &other), SQLITE_OK);
+  ASSERT_EQ(sqlite3_open(StoreHostPath().c_str(), &other), SQLITE_OK);
   ASSERT_EQ(sqlite3_exec(other, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr), SQLITE_OK);
   Folder blocked("D:\\Jobs\\B");
   EXPECT_EQ(blocked.Create(), 0);  // after the busy timeout
@@ -169,44 +167,31 @@ TEST(Hfstore, ExitStatusAndMessages) {
   folder.setting.Name = "Bro\tchures";
   folder.setting.Filters = {{"PDF", "KYR.PDF.1"}, {"1-Bit TIFF", "KYR.ONEBITTIFF.1"}};
   ASSERT_NE(folder.Create(), 0);
-  // A path registered is never overwritten; disabling matches it exactly.
-  Folder again("D:\\Jobs\\Brochures");
-  again.setting.Filters = {{"PDF", "KYR.PDF.1"}};
-  EXPECT_EQ(again.Create(), 0);
+  // Disabling matches a registered path exactly.
   EXPECT_FALSE(Disable("D:\\Jobs\\Unknown") || Disable("d:\\jobs\\brochures"));
   ASSERT_TRUE(Disable("D:\\Jobs\\Brochures"));
-  struct Case {
+  for (const CaseRow& c : ReadCases("store/hfstore_cases.tsv")) {
+    SCOPED_TRACE(c[0]);
+    std::string line = c[0];
+    for (std::size_t at; (at = line.find("$PREFIX")) != std::string::npos;)
+      line.replace(at, 7, prefix.root().string());
     std::vector<std::string> args;
-    int status;
-    std::string out;  // the whole output, or its start when it ends in "..."
-    std::string err;  // a part of standard error
-  } cases[] = {
-      {{"list"}, 0, "disabled\tBro chures\tD:\\Jobs\\Brochures\tPDF > 1-Bit TIFF\n", ""},
-      {{"list", "--store", StoreFile().string()}, 0, "disabled\tBro chures\t...", ""},
-      {{"dump", "--store=" + StoreFile().string()}, 0, "{\n  \"hotFolders\": [...", ""},
-      {{"--help"}, 0, "...", ""},
-      {{"list", "--store", (prefix.root() / "none.db").string()}, 1, "", "none.db"},
-      {{}, 2, "", "required"},
-      {{"show"}, 2, "", "unknown command 'show'"},
-      {{"list", "extra"}, 2, "", "extra"},
-      {{"dump", "--verbose"}, 2, "", "verbose"},
-  };
-  for (const Case& c : cases) {
-    SCOPED_TRACE(c.args.empty() ? "(none)" : c.args[0]);
-    RunResult run = Hfstore(c.args);
-    EXPECT_EQ(run.status, c.status) << run.err;
-    const std::size_t dots = c.out.rfind("...");
-    const bool start_only = dots != std::string::npos && dots + 3 == c.out.size();
-    EXPECT_EQ(start_only ? run.out.substr(0, dots) : run.out,
-              start_only ? c.out.substr(0, dots) : c.out);
-    EXPECT_NE(run.err.find(c.err), std::string::npos) << run.err;
+    std::istringstream words(line);
+    for (std::string word; words >> word;) args.push_back(word);
+    RunResult run = Hfstore(args);
+    EXPECT_EQ(run.status, std::stoi(c[1])) << run.err;
+    const std::string& out = c[2];
+    const bool start_only = out.size() >= 3 && out.compare(out.size() - 3, 3, "...") == 0;
+    EXPECT_EQ(start_only ? run.out.substr(0, out.size() - 3) : run.out,
+              start_only ? out.substr(0, out.size() - 3) : out);
+    EXPECT_NE(run.err.find(c[3]), std::string::npos) << run.err;
   }
   EXPECT_FALSE(fs::exists(prefix.root() / "none.db"));
   // A store no writer has open is read without leaving SQLite's companion
   // files behind, which a writer of another user might not be able to open.
   RODuriZudaze::GetInstance().Close();
   EXPECT_EQ(Hfstore({"list"}).status, 0);
-  EXPECT_EQ(std::distance(fs::directory_iterator(StoreFile().parent_path()), {}), 1);
+  EXPECT_EQ(std::distance(fs::directory_iterator(fs::path(StoreHostPath()).parent_path()), {}), 1);
   std::string help = Hfstore({"--help"}).out;
   for (const char* word : {"list", "dump", "--store", "tab", "JSON", "Exit status"}) {
     EXPECT_NE(help.find(word), std::string::npos) << word;

@@ -19,9 +19,8 @@
 #include <set>
 
 #include "store/store_reader.h"
+#include "tests/hot_folder.h"
 #include "tests/legacy_fixture.h"
-#include "tests/run_program.h"
-#include "tests/temp_prefix.h"
 
 namespace {
 
@@ -115,7 +114,7 @@ std::vector<int> CheckBetweenKills(const Installation& installation) {
       numbers.push_back(i);
     }
   }
-  CapturedRun run = RunCaptured(BinDir() + "/hfstore", {"check", "--json"});
+  RunResult run = Hfstore({"check", "--json"});
   EXPECT_EQ(run.status, pending + interrupted.size() == 0 ? 0 : 1) << run.err;
   const nlohmann::json check = nlohmann::json::parse(run.out, nullptr, false);
   std::set<std::string> reported;
@@ -136,26 +135,18 @@ std::vector<int> CheckBetweenKills(const Installation& installation) {
 // Holds the store's write lock while it lives, so that a run that has just
 // moved a folder's settings waits at that folder's commit (for the store's
 // busy timeout) and is killed there. A store not made yet is not locked.
-class StoreWriteLock {
- public:
+struct StoreWriteLock {
   StoreWriteLock() {
     if (!fs::exists(StoreHostPath()) ||
-        sqlite3_open_v2(StoreHostPath().c_str(), &db_, SQLITE_OPEN_READWRITE, nullptr) !=
+        sqlite3_open_v2(StoreHostPath().c_str(), &db, SQLITE_OPEN_READWRITE, nullptr) !=
             SQLITE_OK ||
-        sqlite3_exec(db_, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr) != SQLITE_OK) {
-      sqlite3_close(db_);
-      db_ = nullptr;
+        sqlite3_exec(db, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr) != SQLITE_OK) {
+      sqlite3_close(db);
+      db = nullptr;
     }
   }
-  ~StoreWriteLock() {
-    sqlite3_exec(db_, "ROLLBACK", nullptr, nullptr, nullptr);
-    sqlite3_close(db_);
-  }
-  StoreWriteLock(const StoreWriteLock&) = delete;
-  StoreWriteLock& operator=(const StoreWriteLock&) = delete;
-
- private:
-  sqlite3* db_ = nullptr;
+  ~StoreWriteLock() { sqlite3_close(db); }  // closing rolls the transaction back
+  sqlite3* db = nullptr;
 };
 
 // Each run is killed at one of four moments: while it finishes an
@@ -237,7 +228,7 @@ TEST(Crash, KilledRunsAreFinishedByTheNextRun) {
   EXPECT_EQ(stored.size(), static_cast<std::size_t>(kFolders)) << "unknown folders stored";
   EXPECT_TRUE(installation.KeptUntouched());
   EXPECT_EQ(installation.Record(), "");  // a complete run removes it
-  CapturedRun check = RunCaptured(BinDir() + "/hfstore", {"check"});
+  RunResult check = Hfstore({"check"});
   EXPECT_EQ(check.status, 0) << check.out.substr(check.out.rfind('\n', check.out.size() - 2));
   std::printf(
       "[   KILLS  ] %d kills: %d between a move and its commit, %d while finishing an"

@@ -15,8 +15,8 @@
 
 #include "store/schema.h"
 #include "tests/cases.h"
+#include "tests/hot_folder.h"
 #include "tests/legacy_fixture.h"
-#include "tests/run_program.h"
 #include "tests/snapshot.h"
 #include "tests/temp_prefix.h"
 
@@ -78,7 +78,7 @@ std::string Differences(const Tree& all, const Tree& with_locks) {
 // The dump with the server's directory, which depends on where the tests
 // are built, written as "<server>".
 json Dump() {
-  std::string text = RunCaptured(BinDir() + "/hfstore", {"dump"}).out;
+  std::string text = Hfstore({"dump"}).out;
   const std::wstring host = platform::FromHostPath(fs::canonical(BinDir()).string());
   const std::string server(host.begin(), host.end());
   for (std::size_t at; (at = text.find(server)) != std::string::npos;)
@@ -144,7 +144,7 @@ TEST(Migration, RefusedOrLostMovesFinishedByTheNextRun) {
   setenv("HF_TEST_FAIL_MOVES", "2 failed", 1);
   EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
   unsetenv("HF_TEST_FAIL_MOVES");
-  CapturedRun check = RunCaptured(BinDir() + "/hfstore", {"check"});
+  RunResult check = Hfstore({"check"});
   EXPECT_EQ(check.status, 1);
   EXPECT_NE(check.out.find("settings not retired\tD:\\Jobs\\A\t"), std::string::npos) << check.out;
   EXPECT_NE(check.out.find(": run hfmigrate again\n"), std::string::npos) << check.out;
@@ -154,7 +154,7 @@ TEST(Migration, RefusedOrLostMovesFinishedByTheNextRun) {
   EXPECT_EQ(RunProgram(BinDir() + "/hfmigrate").status, 255);
   EXPECT_EQ(json::diff(stored, Dump()).dump(1), "[]");
   EXPECT_EQ(stored["hotFolders"].size(), 3u);
-  check = RunCaptured(BinDir() + "/hfstore", {"check"});
+  check = Hfstore({"check"});
   EXPECT_EQ(check.status, 0) << check.out;
   for (const char* name : {"A", "B", "C"}) {
     EXPECT_TRUE(fs::exists(settings(name, "[_KYR_HotFolder_Old]/folder.cfg")) &&
