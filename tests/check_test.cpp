@@ -15,47 +15,25 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// One listed folder D:\Jobs\<name>: how it is listed, stored and left on
-// disk (tests/check_cases.tsv).
-struct Row {
-  std::string name;
-  bool listed_enabled;
-  int stored;     // -1: not stored, else the stored enabled state
-  bool config;    // [_KYR_HotFolder_]\folder.cfg
-  bool retired;   // [_KYR_HotFolder_Old]
-  bool recorded;  // in the record of an interrupted run that was retiring it
-  bool passes = true;
-  std::string line = "";
-};
-
-std::vector<Row> Rows() {
-  std::vector<Row> rows;
-  for (const CaseRow& c : ReadCases("tests/check_cases.tsv")) {
-    rows.push_back({c[0], c[1] == "enabled", c[2] == "-" ? -1 : c[2] == "enabled",
-                    c[3].find("cfg") != std::string::npos, c[3].find("Old") != std::string::npos,
-                    c[4] == "recorded", c[5] == "pass", c[6] + "\t" + c[7] + "\t" + c[8]});
-  }
-  return rows;
-}
-
-std::string Path(const Row& row) {
-  return "D:\\Jobs\\" + row.name;
-}
-
-void Lay(const TempPrefix& prefix, const std::vector<Row>& rows) {
+// Lays out listed folders D:\Jobs\<name>, each a row as in
+// tests/check_cases.tsv: name, listed, stored, on disk, recorded.
+void Lay(const TempPrefix& prefix, const std::vector<CaseRow>& rows) {
   UseUtf8AnsiCodePage(prefix);
   std::vector<LegacyFolder> list;
   std::vector<RunRecordEntry> record;
-  for (const Row& row : rows) {
-    list.push_back({Path(row), static_cast<std::uint16_t>(row.listed_enabled ? 2 : 0)});
-    const fs::path dir = OnDriveD(prefix, "Jobs/" + row.name);
+  for (const CaseRow& row : rows) {
+    const std::string path = "D:\\Jobs\\" + row[0];
+    list.push_back({path, static_cast<std::uint16_t>(row[1] == "enabled" ? 2 : 0)});
+    const fs::path dir = OnDriveD(prefix, "Jobs/" + row[0]);
     fs::create_directories(dir);
-    if (row.config) prefix.WriteFile(dir / "[_KYR_HotFolder_]" / "folder.cfg", "<r/>");
-    if (row.retired) prefix.WriteFile(dir / "[_KYR_HotFolder_Old]" / "folder.cfg", "<r/>");
-    if (row.recorded) record.push_back({Path(row), true});
-    if (row.stored < 0) continue;
-    if (row.stored == 0) RODuriZudaze::GetInstance().CreateNextDisabled(Path(row));
-    ASSERT_NE(Folder(Path(row)).Create(), 0);
+    if (row[3].find("cfg") != std::string::npos)
+      prefix.WriteFile(dir / "[_KYR_HotFolder_]" / "folder.cfg", "<r/>");
+    if (row[3].find("Old") != std::string::npos)
+      prefix.WriteFile(dir / "[_KYR_HotFolder_Old]" / "folder.cfg", "<r/>");
+    if (row[4] == "recorded") record.push_back({path, true});
+    if (row[2] == "-") continue;
+    if (row[2] == "disabled") RODuriZudaze::GetInstance().CreateNextDisabled(path);
+    ASSERT_NE(Folder(path).Create(), 0);
   }
   WriteLegacyList(prefix, list);
   if (!record.empty()) {
@@ -63,12 +41,16 @@ void Lay(const TempPrefix& prefix, const std::vector<Row>& rows) {
   }
 }
 
+std::string Line(const CaseRow& row) {
+  return row[6] + "\t" + row[7] + "\t" + row[8] + "\n";
+}
+
 TEST(Check, EachKindOfFolderAndTheExitStatus) {
   TempPrefix prefix;
-  const std::vector<Row> rows = Rows();
+  const std::vector<CaseRow> rows = ReadCases("tests/check_cases.tsv");
   Lay(prefix, rows);
   std::string expected;
-  for (const Row& row : rows) expected += row.line + "\n";
+  for (const CaseRow& row : rows) expected += Line(row);
   expected +=
       "11 listed: 2 migrated, 4 not migrated, 1 interrupted, 1 enabled state differs,"
       " 2 settings not retired, 1 path not decodable; not every folder with legacy settings is"
@@ -94,21 +76,22 @@ TEST(Check, EachKindOfFolderAndTheExitStatus) {
 // A run that went well exits 0; any one folder with legacy settings that is
 // not migrated as listed makes it 1 on its own.
 TEST(Check, ExitStatusOfEachKindAlone) {
-  const std::vector<Row> all = Rows();
-  std::vector<Row> passing;
-  for (const Row& row : all) {
-    if (row.passes) passing.push_back(row);
+  const std::vector<CaseRow> all = ReadCases("tests/check_cases.tsv");
+  std::vector<CaseRow> passing;
+  for (const CaseRow& row : all) {
+    if (row[5] == "pass") passing.push_back(row);
   }
-  for (const Row& odd : all) {
-    if (odd.passes && &odd != &all[0]) continue;  // once with the passing rows alone
-    std::vector<Row> rows = passing;
-    if (!odd.passes) rows.push_back(odd);
-    SCOPED_TRACE(rows.back().line);
+  for (const CaseRow& odd : all) {
+    const bool passes = odd[5] == "pass";
+    if (passes && &odd != &all[0]) continue;  // once with the passing rows alone
+    std::vector<CaseRow> rows = passing;
+    if (!passes) rows.push_back(odd);
+    SCOPED_TRACE(Line(rows.back()));
     TempPrefix prefix;
     Lay(prefix, rows);
     RunResult run = Hfstore({"check"});
-    EXPECT_EQ(run.status, odd.passes ? 0 : 1) << run.out;
-    EXPECT_NE(run.out.find(odd.passes ? "; every" : "; not every"), std::string::npos);
+    EXPECT_EQ(run.status, passes ? 0 : 1) << run.out;
+    EXPECT_NE(run.out.find(passes ? "; every" : "; not every"), std::string::npos);
   }
 }
 
@@ -132,7 +115,7 @@ TEST(RunRecord, TrustedOnlyWhenWholeAndOurs) {
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);
     TempPrefix prefix;
-    Lay(prefix, {{"X", true, -1, false, true, false}, {"Y", true, -1, true, false, false}});
+    Lay(prefix, {{"X", "enabled", "-", "Old", "-"}, {"Y", "enabled", "-", "cfg", "-"}});
     const fs::path record = prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run";
     prefix.WriteFile(record, c.record);
     CHFMigrator engine;
@@ -155,7 +138,7 @@ TEST(RunRecord, TrustedOnlyWhenWholeAndOurs) {
 // that the next run, with the store mended, puts X back and migrates it.
 TEST(RunRecord, KeptWhileAFolderIsUndecided) {
   TempPrefix prefix;
-  Lay(prefix, {{"X", true, -1, true, false, false}, {"Y", true, -1, true, false, false}});
+  Lay(prefix, {{"X", "enabled", "-", "cfg", "-"}, {"Y", "enabled", "-", "cfg", "-"}});
   const fs::path record = prefix.Drive('c') / "ProgramData/KYR/Dirorodiv/hfmigrate.run";
   prefix.WriteFile(fs::path(StoreHostPath()), std::string(4096, 'x'));
   platform::FailNextMoves(1, platform::MoveOutcome::kFailed, /*skip=*/1);
