@@ -48,16 +48,14 @@ wxIMPLEMENT_APP_NO_MAIN(CHFGuiApp);
 // runs: on Windows a failed one opens a modal message box even in a console
 // program, and nothing may wait for a click on an unattended server. (The
 // Windows executables cannot open one anyway: platform/win32_no_dialogs.)
-#ifdef _WIN32
-int main(int, char**) {
-  wxDisableAsserts();
-  wxDISABLE_DEBUG_LOGGING_IN_RELEASE_BUILD();
-  return wxEntry();  // the library reads the wide command line itself
-}
-#else
 int main(int argc, char** argv) {
   wxDisableAsserts();
   wxDISABLE_DEBUG_LOGGING_IN_RELEASE_BUILD();
+#ifdef _WIN32
+  (void)argc;
+  (void)argv;
+  return wxEntry();  // the library reads the wide command line itself
+#else
   return wxEntry(argc, argv);
-}
 #endif
+}

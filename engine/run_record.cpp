@@ -114,9 +114,11 @@ bool DecodeRunRecord(const std::string& bytes, std::vector<RunRecordEntry>* entr
 // an administrator, SYSTEM or the running user, or the record is not
 // touched at all. Behind someone else's link there is no record of ours.
 namespace {
+platform::FolderTrust RecordFolder(bool create) {
+  return platform::OpenTrustedFolder(StoreFolder(), create).trust;
+}
 bool RecordFolderTrusted(bool create) {
-  return platform::OpenTrustedFolder(StoreFolder(), create).trust ==
-         platform::FolderTrust::kTrusted;
+  return RecordFolder(create) == platform::FolderTrust::kTrusted;
 }
 }  // namespace
 
@@ -146,7 +148,7 @@ bool WriteRunRecord(const std::vector<RunRecordEntry>& entries) {
 bool RemoveRunRecord() {
   const std::wstring path = RunRecordPath();
   if (path.empty()) return true;
-  const platform::FolderTrust trust = platform::OpenTrustedFolder(StoreFolder(), false).trust;
+  const platform::FolderTrust trust = RecordFolder(/*create=*/false);
   return trust == platform::FolderTrust::kMissing ||
          (trust == platform::FolderTrust::kTrusted && platform::RemoveFile(path));
 }

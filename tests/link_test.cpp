@@ -10,6 +10,7 @@
 #include "engine/run_record.h"
 #include "store/store_reader.h"
 #include "tests/cases.h"
+#include "tests/hot_folder.h"
 #include "tests/legacy_fixture.h"
 #include "tests/run_program.h"
 #include "tests/snapshot.h"
@@ -58,11 +59,11 @@ TEST(Links, NothingWrittenThroughAnotherUsersLink) {
     EXPECT_EQ(Snapshot(prefix.Drive('d')) == drive_before, !migrated);
     EXPECT_EQ(Snapshot(outside) == outside_before, owner != 0);
     for (const char* command : {"list", "check"}) {
-      const CapturedRun run = RunCaptured(BinDir() + "/hfstore", {command});
+      const RunResult run = Hfstore({command});
       EXPECT_EQ(run.status, refusal.empty() ? 0 : 1) << command << run.err;
       EXPECT_NE(run.err.find(refusal), std::string::npos) << run.err;
     }
-    EXPECT_EQ(RunCaptured(BinDir() + "/hfstore", {"list"}).out,
+    EXPECT_EQ(Hfstore({"list"}).out,
               migrated ? "enabled\tA\tD:\\Jobs\\A\tPDF > PS > TIFF > VDP\n" : "");
   }
 }

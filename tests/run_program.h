@@ -55,7 +55,6 @@ struct RunResult {
   std::string out;
   std::string err;
 };
-using CapturedRun = RunResult;
 
 inline RunResult RunProgram(const std::string& path, const std::vector<std::string>& args = {}) {
   const auto start = std::chrono::steady_clock::now();
@@ -77,10 +76,6 @@ inline RunResult RunProgram(const std::string& path, const std::vector<std::stri
   }
   run.seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   return run;
-}
-
-inline RunResult RunCaptured(const std::string& path, const std::vector<std::string>& args) {
-  return RunProgram(path, args);
 }
 
 // The hotfolder.exe stand-in, running until the scope ends, so that the tool
