@@ -5,8 +5,6 @@
 #include <wx/mstream.h>
 
 #include <cstring>
-#include <filesystem>
-#include <fstream>
 #include <vector>
 
 #include "platform/platform.h"
@@ -52,18 +50,6 @@ int XMLCALL OnUnknownEncoding(void*, const XML_Char*, XML_Encoding* info) {
   info->convert = nullptr;
   info->release = nullptr;
   return XML_STATUS_OK;
-}
-
-// Reads the file, refusing it once it holds more than kMaxConfigBytes.
-bool ReadBounded(const platform::HostPath& path, std::string* bytes) {
-  std::ifstream in(std::filesystem::path(path), std::ios::binary);
-  if (!in) return false;
-  char chunk[64 * 1024];
-  while (in.read(chunk, sizeof(chunk)) || in.gcount() > 0) {
-    bytes->append(chunk, static_cast<std::size_t>(in.gcount()));
-    if (bytes->size() > kMaxConfigBytes) return false;
-  }
-  return !in.bad();
 }
 
 // Whether a scan of the markup alone shows the bounds hold, so that the
@@ -150,7 +136,11 @@ bool XmlWithinBounds(const std::string& bytes) {
 
 bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc) {
   std::string bytes;
-  if (!ReadBounded(platform::ToLongHostPath(windows_path.ToStdWstring()), &bytes)) return false;
+  // Read as any program opening it by name would: through a link.
+  if (platform::ReadRegularFile(windows_path.ToStdWstring(), kMaxConfigBytes, &bytes,
+                                platform::Links::kFollowed) != platform::FileRead::kRead) {
+    return false;
+  }
   if (!PlainlyWithinBounds(bytes) && !XmlWithinBounds(bytes)) return false;
   // The tool prints nothing; wx would log a parse failure of its own.
   wxLogNull quiet;

@@ -132,11 +132,13 @@ bool RenameFile(const std::wstring& from, const std::wstring& to);
 // Removes a regular file. True when none is left under that name.
 bool RemoveFile(const std::wstring& windows_path);
 
-// Reads a whole regular file of at most `max_bytes`, never through a link:
-// a link, a directory or anything else under the name is kNotAFile.
+// Reads a whole regular file of at most `max_bytes`. A directory or anything
+// else under the name is kNotAFile; so is a link, unless `links` says that it
+// is followed to the file it names, as any program opening the file would.
 enum class FileRead { kRead, kMissing, kNotAFile, kFailed };
+enum class Links { kRefused, kFollowed };
 FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
-                         std::string* bytes);
+                         std::string* bytes, Links links = Links::kRefused);
 
 // ---- Folders of an elevated program -----------------------------------------
 //

@@ -8,6 +8,7 @@
 #include <sys/xattr.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <string>
 
@@ -21,8 +22,7 @@ namespace {
 constexpr char kAttributeName[] = "user.DOSATTRIB";
 
 bool StatWindowsPath(const std::wstring& windows_path, struct stat* st) {
-  const HostPath host = ToHostPath(windows_path);
-  return !host.empty() && stat(host.c_str(), st) == 0;
+  return posix::StatMappedPath(posix::MapWindowsPath(windows_path), st);
 }
 
 // Reads "0x<hex>" at the start of the attribute text. Anything else (such
@@ -99,9 +99,10 @@ bool CreateDirectories(const std::wstring& windows_path) {
 }
 
 bool GetFileAttributes(const std::wstring& windows_path, std::uint32_t* attributes) {
-  const HostPath host = ToHostPath(windows_path);
+  const posix::MappedPath mapped = posix::MapWindowsPath(windows_path);
   struct stat st;
-  if (attributes == nullptr || host.empty() || stat(host.c_str(), &st) != 0) return false;
+  if (attributes == nullptr || !posix::StatMappedPath(mapped, &st)) return false;
+  const HostPath host = mapped.Join();
   char text[256];
   const ssize_t size = getxattr(host.c_str(), kAttributeName, text, sizeof text);
   std::uint32_t bits = 0;
@@ -220,12 +221,13 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
 }
 
 FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
-                         std::string* bytes) {
+                         std::string* bytes, Links links) {
   bytes->clear();
   const HostPath host = ToHostPath(windows_path);
   if (host.empty()) return FileRead::kMissing;
   // O_NONBLOCK: a FIFO under the name must not hold the read up.
-  const int fd = open(host.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+  const int no_follow = links == Links::kFollowed ? 0 : O_NOFOLLOW;
+  const int fd = open(host.c_str(), O_RDONLY | no_follow | O_NONBLOCK | O_CLOEXEC);
   if (fd < 0) {
     if (errno == ENOENT) return FileRead::kMissing;
     return errno == ELOOP ? FileRead::kNotAFile : FileRead::kFailed;
@@ -234,17 +236,21 @@ FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes
   FileRead result = fstat(fd, &st) != 0   ? FileRead::kFailed
                     : S_ISREG(st.st_mode) ? FileRead::kRead
                                           : FileRead::kNotAFile;
-  char buffer[1 << 16];
+  // Read straight into the result, sized from the file's own size: one byte
+  // more than that shows the end at once, or that the file has grown.
+  std::size_t size = 0;
+  if (result == FileRead::kRead) {
+    bytes->resize(std::min(static_cast<std::size_t>(st.st_size), max_bytes) + 1);
+  }
   while (result == FileRead::kRead) {
-    const ssize_t n = read(fd, buffer, sizeof buffer);
+    if (size == bytes->size()) bytes->resize(std::min(2 * size, max_bytes + 1));
+    const ssize_t n = read(fd, &(*bytes)[size], bytes->size() - size);
     if (n < 0 && errno == EINTR) continue;
     if (n == 0) break;
-    if (n < 0 || bytes->size() + static_cast<std::size_t>(n) > max_bytes) {
-      result = FileRead::kFailed;
-    } else {
-      bytes->append(buffer, static_cast<std::size_t>(n));
-    }
+    size += n < 0 ? 0 : static_cast<std::size_t>(n);
+    if (n < 0 || size > max_bytes) result = FileRead::kFailed;
   }
+  bytes->resize(size);
   close(fd);
   if (result != FileRead::kRead) bytes->clear();
   return result;

@@ -3,6 +3,8 @@
 #ifndef HF_PLATFORM_POSIX_INTERNAL_H_
 #define HF_PLATFORM_POSIX_INTERNAL_H_
 
+#include <sys/stat.h>
+
 #include <string>
 #include <vector>
 
@@ -32,6 +34,11 @@ struct MappedPath {
   bool valid = false;
   std::string root;
   std::vector<std::string> parts;
+  // What the mapping's own lookups showed of the whole path: present, with
+  // its lstat in `status`; absent in any letter case; or not known (a
+  // component matched in another case).
+  enum class Entry { kUnknown, kPresent, kAbsent } entry = Entry::kUnknown;
+  struct stat status = {};
 
   std::string Join() const;
 };
@@ -40,6 +47,10 @@ struct MappedPath {
 // place (empty, rooted without a drive, a share without server or name,
 // relative while the current directory lies outside every drive).
 MappedPath MapWindowsPath(const std::wstring& windows_path);
+
+// stat of a mapped path, answered from the mapping's lstat where that shows
+// the same (the path is absent, or present and not a link).
+bool StatMappedPath(const MappedPath& mapped, struct stat* st);
 
 // The ANSI code page the prefix records for Windows programs ("ACP" in
 // system.reg), read once per prefix; 0 when it records none.

@@ -22,19 +22,19 @@ bool IsAsciiLetter(wchar_t c) {
   return (c >= L'a' && c <= L'z') || (c >= L'A' && c <= L'Z');
 }
 
-// Adds the components of `rest` (backslash-separated) to `parts`. "." and
-// empty components vanish; ".." removes the previous component but never
+// Adds the components of `rest` (backslash-separated UTF-8) to `parts`. "."
+// and empty components vanish; ".." removes the previous component but never
 // one of the first `floor` (the share's server and name). A ".." at the root
 // is dropped, as Windows does, so no path leaves its drive.
-void AddComponents(std::wstring_view rest, size_t floor, std::vector<std::wstring>* parts) {
+void AddComponents(std::string_view rest, size_t floor, std::vector<std::string>* parts) {
   size_t start = 0;
   while (start <= rest.size()) {
-    size_t end = rest.find(L'\\', start);
-    if (end == std::wstring_view::npos) end = rest.size();
-    const std::wstring_view part = rest.substr(start, end - start);
+    size_t end = rest.find('\\', start);
+    if (end == std::string_view::npos) end = rest.size();
+    const std::string_view part = rest.substr(start, end - start);
     start = end + 1;
-    if (part.empty() || part == L".") continue;
-    if (part != L"..") {
+    if (part.empty() || part == ".") continue;
+    if (part != "..") {
       parts->emplace_back(part);
     } else if (parts->size() > floor) {
       parts->pop_back();
@@ -44,10 +44,11 @@ void AddComponents(std::wstring_view rest, size_t floor, std::vector<std::wstrin
 
 // The entry of `dir` that `name` names: itself when it exists in that case,
 // else the single entry that differs from it only in case. Empty when there
-// is none (or more than one).
-std::string MatchEntry(const std::string& dir, const std::string& name) {
+// is none (or more than one). `tried` says an lstat of the name in its own
+// case has failed already.
+std::string MatchEntry(const std::string& dir, const std::string& name, bool tried) {
   struct stat st;
-  if (lstat((dir + "/" + name).c_str(), &st) == 0) return name;
+  if (!tried && lstat((dir + "/" + name).c_str(), &st) == 0) return name;
   DIR* handle = opendir(dir.c_str());
   if (handle == nullptr) return std::string();
   const std::wstring wanted = Utf8ToWide(name);
@@ -67,36 +68,47 @@ std::string MatchEntry(const std::string& dir, const std::string& name) {
 // lstat calls can tell: nearly every path the tool touches exists, or all of
 // it but its last component does (a name about to be created). An lstat of
 // such a path shows that each of those components matches itself, which is
-// what the walk in ResolveParts finds with one lstat per component.
-size_t ExactPrefix(const std::string& dir, const std::vector<std::string>& parts) {
+// what the walk in ResolveParts finds with one lstat per component. The
+// whole path's lstat is kept in `mapped`, so that callers need not ask again.
+size_t ExactPrefix(const std::string& dir, const std::vector<std::string>& parts,
+                   MappedPath* mapped) {
   if (parts.empty()) return 0;
   std::string path = dir;
   for (const std::string& part : parts) {
     path += '/';
     path += part;
   }
-  struct stat st;
-  if (lstat(path.c_str(), &st) == 0) return parts.size();
+  if (lstat(path.c_str(), &mapped->status) == 0) {
+    mapped->entry = MappedPath::Entry::kPresent;
+    return parts.size();
+  }
   if (parts.size() < 2) return 0;
   path.resize(path.size() - parts.back().size() - 1);
+  struct stat st;
   return lstat(path.c_str(), &st) == 0 ? parts.size() - 1 : 0;
 }
 
-// Turns the Windows components into host components below `root`, following
-// the case of existing entries for as long as the path exists.
-void ResolveParts(const std::vector<std::wstring>& windows_parts, MappedPath* mapped) {
+// Turns the components into host components below `root`, following the
+// case of existing entries for as long as the path exists. Where the walk
+// stops, nothing of that name exists in any case, so neither does the path.
+void ResolveParts(std::vector<std::string> parts, MappedPath* mapped) {
   std::string dir = mapped->root.empty() ? "." : mapped->root;
-  std::vector<std::string>& parts = mapped->parts;
-  for (const std::wstring& windows_part : windows_parts) parts.push_back(WideToUtf8(windows_part));
-  const size_t exact = ExactPrefix(dir, parts);
+  mapped->parts = std::move(parts);
+  std::vector<std::string>& names = mapped->parts;
+  const size_t exact = ExactPrefix(dir, names, mapped);
   for (size_t i = 0; i < exact; ++i) {
     dir += '/';
-    dir += parts[i];
+    dir += names[i];
   }
-  for (size_t i = exact; i < parts.size(); ++i) {
-    const std::string match = MatchEntry(dir, parts[i]);
-    if (match.empty()) break;  // the rest does not exist; it keeps its case
-    parts[i] = match;
+  for (size_t i = exact; i < names.size(); ++i) {
+    // With all but the last component there, ExactPrefix has tried it.
+    const bool tried = i == exact && exact + 1 == names.size();
+    const std::string match = MatchEntry(dir, names[i], tried);
+    if (match.empty()) {
+      mapped->entry = MappedPath::Entry::kAbsent;
+      break;  // the rest does not exist; it keeps its case
+    }
+    names[i] = match;
     dir += '/';
     dir += match;
   }
@@ -185,7 +197,7 @@ MappedPath MapWindowsPath(const std::wstring& windows_path) {
   }
   if (path.empty()) return mapped;
   const std::string prefix = PrefixDirectory();
-  std::vector<std::wstring> parts;
+  std::vector<std::string> parts;
   if (path.compare(0, 2, L"\\\\") == 0) {
     // A share: its server and name are the root that ".." cannot leave.
     const size_t server_end = path.find(L'\\', 2);
@@ -197,14 +209,14 @@ MappedPath MapWindowsPath(const std::wstring& windows_path) {
     for (const std::wstring& name : {server, share}) {
       if (name.empty() || name == L"." || name == L"..") return mapped;
     }
-    parts = {server, share};
+    parts = {WideToUtf8(server), WideToUtf8(share)};
     if (share_end != std::wstring::npos) {
-      AddComponents(std::wstring_view(path).substr(share_end + 1), 2, &parts);
+      AddComponents(WideToUtf8(path.substr(share_end + 1)), 2, &parts);
     }
     mapped.root = prefix + "/dosdevices/unc";
   } else if (path.size() >= 2 && IsAsciiLetter(path[0]) && path[1] == L':') {
     // "X:rest" has no current directory of its own here: it counts from X:\.
-    AddComponents(std::wstring_view(path).substr(2), 0, &parts);
+    AddComponents(WideToUtf8(path.substr(2)), 0, &parts);
     mapped.root = prefix + "/dosdevices/" + static_cast<char>(FoldCase(path[0])) + ":";
   } else if (path[0] == L'\\') {
     // Rooted on "the current drive": there is none to take it from.
@@ -218,9 +230,18 @@ MappedPath MapWindowsPath(const std::wstring& windows_path) {
     return MapWindowsPath(current + L"\\" + path);
   }
   if (prefix.empty() && !mapped.root.empty()) return mapped;
-  ResolveParts(parts, &mapped);
+  ResolveParts(std::move(parts), &mapped);
   mapped.valid = true;
   return mapped;
+}
+
+bool StatMappedPath(const MappedPath& mapped, struct stat* st) {
+  if (!mapped.valid || mapped.entry == MappedPath::Entry::kAbsent) return false;
+  if (mapped.entry == MappedPath::Entry::kPresent && !S_ISLNK(mapped.status.st_mode)) {
+    *st = mapped.status;
+    return true;
+  }
+  return stat(mapped.Join().c_str(), st) == 0;
 }
 
 bool CreateHostDirectories(const std::string& host_path) {

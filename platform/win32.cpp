@@ -272,15 +272,16 @@ bool ReplaceFileDurably(const std::wstring& windows_path, const std::string& byt
 }
 
 FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes,
-                         std::string* bytes) {
+                         std::string* bytes, Links links) {
   bytes->clear();
   const std::wstring path = ToLongHostPath(windows_path);
   if (path.empty()) return FileRead::kMissing;
-  // Opened as itself if it is a link; without backup semantics a directory
-  // does not open at all.
+  // Opened as itself if it is a link and links are refused; without backup
+  // semantics a directory does not open at all.
+  const DWORD flags = links == Links::kFollowed ? 0 : FILE_FLAG_OPEN_REPARSE_POINT;
   ScopedHandle file(FileHandle(CreateFileW(
       path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
-      OPEN_EXISTING, FILE_FLAG_OPEN_REPARSE_POINT, nullptr)));
+      OPEN_EXISTING, flags, nullptr)));
   if (file.get() == nullptr) {
     const DWORD error = GetLastError();
     if (error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND) return FileRead::kMissing;
@@ -291,8 +292,12 @@ FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes
   }
   BY_HANDLE_FILE_INFORMATION info;
   if (!GetFileInformationByHandle(file.get(), &info)) return FileRead::kFailed;
-  if (GetFileType(file.get()) != FILE_TYPE_DISK ||
-      (info.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0) {
+  // A file reached through a link may itself be a reparse point of another
+  // kind (a deduplicated or cloud file), which reads as any other file.
+  const DWORD refused = links == Links::kFollowed
+                            ? FILE_ATTRIBUTE_DIRECTORY
+                            : FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY;
+  if (GetFileType(file.get()) != FILE_TYPE_DISK || (info.dwFileAttributes & refused) != 0) {
     return FileRead::kNotAFile;
   }
   char buffer[1 << 16];
