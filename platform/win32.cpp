@@ -279,9 +279,9 @@ FileRead ReadRegularFile(const std::wstring& windows_path, std::size_t max_bytes
   // Opened as itself if it is a link and links are refused; without backup
   // semantics a directory does not open at all.
   const DWORD flags = links == Links::kFollowed ? 0 : FILE_FLAG_OPEN_REPARSE_POINT;
-  ScopedHandle file(FileHandle(CreateFileW(
-      path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
-      OPEN_EXISTING, flags, nullptr)));
+  ScopedHandle file(FileHandle(CreateFileW(path.c_str(), GENERIC_READ,
+                                           FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE,
+                                           nullptr, OPEN_EXISTING, flags, nullptr)));
   if (file.get() == nullptr) {
     const DWORD error = GetLastError();
     if (error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND) return FileRead::kMissing;
