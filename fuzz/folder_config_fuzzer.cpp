@@ -7,16 +7,21 @@
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
+#include <iterator>
 #include <string>
+#include <string_view>
 #include <system_error>
+#include <utility>
 #include <vector>
 
 #include <wx/log.h>
+#include <wx/mstream.h>
 #include <wx/sstream.h>
 #include <wx/xml/xml.h>
 
 #include "engine/migrator.h"
 #include "fuzz/fuzz_support.h"
+#include "legacy/config_tree.h"
 #include "legacy/xml_load.h"
 #include "store/store.h"
 #include "store/store_reader.h"
@@ -76,31 +81,84 @@ bool IsFilterSettingXml(const wxString& text) {
   return doc.Load(stream) && doc.GetRoot() && doc.GetRoot()->GetName() == "FilterSetting";
 }
 
-// How deep the elements of a loaded document nest, counted without
-// recursion so that the count itself cannot overflow the stack.
-int Depth(const wxXmlNode* root) {
+// How deep the elements of a loaded tree nest, counted without recursion so
+// that the count itself cannot overflow the stack.
+int Depth(const ConfigTree& tree) {
   int deepest = 0;
   int depth = 1;
-  for (const wxXmlNode* node = root; node;) {
-    if (node->GetType() == wxXML_ELEMENT_NODE) deepest = std::max(deepest, depth);
-    if (node->GetChildren()) {
-      node = node->GetChildren();
+  for (ConfigTree::Id node = tree.Root(); node != ConfigTree::kNone;) {
+    if (tree.GetType(node) == ConfigTree::Type::kElement) deepest = std::max(deepest, depth);
+    if (tree.FirstChild(node) != ConfigTree::kNone) {
+      node = tree.FirstChild(node);
       ++depth;
       continue;
     }
-    for (; node && !node->GetNext(); --depth) node = node->GetParent();
-    if (node) node = node->GetNext();
+    for (; node != ConfigTree::kNone && tree.Next(node) == ConfigTree::kNone; --depth)
+      node = tree.Parent(node);
+    if (node != ConfigTree::kNone) node = tree.Next(node);
   }
   return deepest;
 }
 
-// A document the reader accepts nests within the bound: wx builds and frees
-// its tree by recursion, so the bound is what keeps the stack safe however
-// the acceptance was decided.
+// A document the reader accepts nests within the bound.
 void CheckLoadBounds() {
+  ConfigTree tree;
+  if (!LoadFolderConfig(wxString(kFolder) + "\\" + kSettingsDir + "\\folder.cfg", &tree)) return;
+  FUZZ_CHECK(Depth(tree) <= kMaxConfigDepth);
+}
+
+const std::pair<wxXmlNodeType, ConfigTree::Type> kNodeTypes[] = {
+    {wxXML_ELEMENT_NODE, ConfigTree::Type::kElement},
+    {wxXML_TEXT_NODE, ConfigTree::Type::kText},
+    {wxXML_CDATA_SECTION_NODE, ConfigTree::Type::kCdata},
+    {wxXML_COMMENT_NODE, ConfigTree::Type::kComment},
+    {wxXML_PI_NODE, ConfigTree::Type::kPi}};
+
+wxString Wide(std::string_view utf8) {
+  return utf8.empty() ? wxString() : wxString::FromUTF8Unchecked(utf8.data(), utf8.size());
+}
+
+// Of the names, only an element's and a processing instruction's target
+// mean something; wx calls the others "text", "cdata" and "comment".
+bool SameNode(const wxXmlNode* node, const ConfigTree& tree, ConfigTree::Id id) {
+  auto row = std::find_if(std::begin(kNodeTypes), std::end(kNodeTypes),
+                          [&](const auto& type) { return type.first == node->GetType(); });
+  if (row == std::end(kNodeTypes) || row->second != tree.GetType(id)) return false;
+  const bool named =
+      row->second == ConfigTree::Type::kElement || row->second == ConfigTree::Type::kPi;
+  return (named ? node->GetName() : wxString()) == Wide(tree.Name(id)) &&
+         node->GetContent() == Wide(tree.Content(id));
+}
+
+// The tree the reader works on is the one wx builds from the same bytes,
+// less the text nodes that are blank as a whole: the same nodes, kinds,
+// names and texts, linked the same way. Only documents within the bounds
+// are given to wx, which builds and frees its tree by recursion.
+void CheckTreeAsWxBuildsIt(const std::string& bytes) {
+  if (!XmlWithinBounds(bytes)) return;
+  wxLogNull quiet;
+  wxMemoryInputStream stream(bytes.data(), bytes.size());
   wxXmlDocument doc;
-  if (!LoadFolderConfig(wxString(kFolder) + "\\" + kSettingsDir + "\\folder.cfg", &doc)) return;
-  FUZZ_CHECK(Depth(doc.GetRoot()) <= kMaxConfigDepth);
+  ConfigTree tree;
+  const bool loaded = doc.Load(stream, "UTF-8", wxXMLDOC_KEEP_WHITESPACE_NODES);
+  FUZZ_CHECK(tree.Parse(bytes) == loaded);
+  if (!loaded) return;
+  std::vector<std::pair<const wxXmlNode*, ConfigTree::Id>> pending{
+      {doc.GetDocumentNode(), ConfigTree::kDocument}};
+  while (!pending.empty()) {
+    const auto [parent, parent_id] = pending.back();
+    pending.pop_back();
+    ConfigTree::Id id = tree.FirstChild(parent_id);
+    for (const wxXmlNode* node = parent->GetChildren(); node; node = node->GetNext()) {
+      if (node->GetType() == wxXML_TEXT_NODE && node->IsWhitespaceOnly()) continue;
+      FUZZ_CHECK(id != ConfigTree::kNone && tree.Parent(id) == parent_id);
+      FUZZ_CHECK(SameNode(node, tree, id));
+      if (node == doc.GetRoot()) FUZZ_CHECK(id == tree.Root());
+      pending.push_back({node, id});
+      id = tree.Next(id);
+    }
+    FUZZ_CHECK(id == ConfigTree::kNone);
+  }
 }
 
 }  // namespace
@@ -113,6 +171,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const Tree before = Without(Snapshot(prefix.root(), &whole), kStoreDir);
   FUZZ_CHECK(whole);
   CheckLoadBounds();
+  CheckTreeAsWxBuildsIt(InputBytes(data, size));
 
   CHFMigrator engine;
   // The server's directory is found among the running processes; it does

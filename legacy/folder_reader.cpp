@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <string_view>
 #include <vector>
 
 #include "engine/legacy_filters.h"
@@ -14,8 +15,7 @@
 
 namespace {
 
-// Names are wide, as the document's are: a narrow literal would pass through
-// the C library's multibyte conversion on every search, for every folder.
+// Names are wide, as the filter table's keys are.
 struct Section {
   const wchar_t* name;
   SettingsMember map;
@@ -40,25 +40,49 @@ const Section kImposeSections[] = {
 const wchar_t* const kImposeParts[] = {L"Layout", L"SheetSize", L"SheetMargin", L"PaperSize",
                                        L"PrinterMarks"};
 
+using Id = ConfigTree::Id;
+using Type = ConfigTree::Type;
+constexpr Id kNone = ConfigTree::kNone;
+
+// The names looked for are ASCII, so comparing their characters with the
+// bytes of a UTF-8 name matches exactly the names that are equal as wide
+// strings, without converting any.
+bool NameIs(std::string_view utf8, const wchar_t* ascii) {
+  for (char c : utf8) {
+    if (*ascii == 0 || static_cast<wchar_t>(static_cast<unsigned char>(c)) != *ascii) return false;
+    ++ascii;
+  }
+  return *ascii == 0;
+}
+
+// Only what the maps keep, or what a number is read from, is made wide, as
+// wx made its strings from expat's UTF-8 (on Windows a character beyond
+// 16 bits becomes a surrogate pair). An empty slice is not converted: wx
+// would take the character after it for the start of a string that failed
+// to convert, and assert.
+wxString Wide(std::string_view utf8) {
+  return utf8.empty() ? wxString() : wxString::FromUTF8Unchecked(utf8.data(), utf8.size());
+}
+
 // Comments and processing instructions do not count where a node is located
 // by position: a note added to a folder.cfg by hand must not shift which
 // child is taken as a container's identifier or enable text.
-const wxXmlNode* NthChild(const wxXmlNode* node, int n) {
-  for (const wxXmlNode* child = node->GetChildren(); child; child = child->GetNext()) {
-    wxXmlNodeType type = child->GetType();
-    if (type == wxXML_COMMENT_NODE || type == wxXML_PI_NODE) continue;
+Id NthChild(const ConfigTree& tree, Id node, int n) {
+  for (Id child = tree.FirstChild(node); child != kNone; child = tree.Next(child)) {
+    Type type = tree.GetType(child);
+    if (type == Type::kComment || type == Type::kPi) continue;
     if (n-- == 0) return child;
   }
-  return nullptr;
+  return kNone;
 }
 
 // A container's enable text is the text inside its third child. False when
 // the container is too small to hold one.
-bool ContainerEnableText(const wxXmlNode* container, wxString* text) {
-  const wxXmlNode* third = container ? NthChild(container, 2) : nullptr;
-  const wxXmlNode* holder = third ? NthChild(third, 0) : nullptr;
-  if (!holder) return false;
-  *text = holder->GetContent();
+bool ContainerEnableText(const ConfigTree& tree, Id container, std::string_view* text) {
+  Id third = container != kNone ? NthChild(tree, container, 2) : kNone;
+  Id holder = third != kNone ? NthChild(tree, third, 0) : kNone;
+  if (holder == kNone) return false;
+  *text = tree.Content(holder);
   return true;
 }
 
@@ -85,31 +109,31 @@ wxString Flag(bool on) {
 // Each filter's entry gets the enable text of its own container, or an empty
 // text when it has none; a text taken for another filter could switch on a
 // filter the folder does not have.
-void ReadFilterSections(CHFMigrator& engine, wxXmlNode* root) {
+void ReadFilterSections(CHFMigrator& engine, const ConfigTree& tree, Id root) {
   for (const LegacyFilter& filter : kLegacyFilters) {
     if (filter.enabled_by != EnabledBy::kSection) continue;
-    wxXmlNode* section = FindElement(root, filter.key);
-    ReadSection(section, engine.*filter.legacy);
-    wxString enable;
-    if (section) ContainerEnableText(section->GetParent(), &enable);
-    engine.m_FilterEnable.GetOrInsert(filter.key) = enable;
+    Id section = FindElement(tree, root, filter.key);
+    ReadSection(tree, section, engine.*filter.legacy);
+    std::string_view enable;
+    if (section != kNone) ContainerEnableText(tree, tree.Parent(section), &enable);
+    engine.m_FilterEnable.GetOrInsert(filter.key) = Wide(enable);
   }
 }
 
 // The containers without a settings section are known by identifier only.
-void ReadFilterContainers(CHFMigrator& engine, wxXmlNode* root) {
+void ReadFilterContainers(CHFMigrator& engine, const ConfigTree& tree, Id root) {
   // A sum of 32-bit terms cannot overflow these.
   std::vector<std::int64_t> counts(kLegacyFilters.size(), 0);
-  for (const wxXmlNode* node = FindElement(root, wxS("FILTERID")); node; node = node->GetNext()) {
-    const wxXmlNode* first = NthChild(node, 0);
-    wxString enable;
-    if (!first || !ContainerEnableText(node, &enable)) continue;
-    std::size_t i = IdentifyFilter(first->GetContent());
+  for (Id node = FindElement(tree, root, L"FILTERID"); node != kNone; node = tree.Next(node)) {
+    Id first = NthChild(tree, node, 0);
+    std::string_view enable;
+    if (first == kNone || !ContainerEnableText(tree, node, &enable)) continue;
+    std::size_t i = IdentifyFilter(Wide(tree.Content(first)));
     if (i == kLegacyFilters.size()) continue;
     if (kLegacyFilters[i].enabled_by == EnabledBy::kCount) {
-      counts[i] += ReadInt32(enable);  // no leading number counts 0
+      counts[i] += ReadInt32(Wide(enable));  // no leading number counts 0
     } else {
-      engine.m_FilterEnable.GetOrInsert(kLegacyFilters[i].key) = Flag(enable == wxS("1"));
+      engine.m_FilterEnable.GetOrInsert(kLegacyFilters[i].key) = Flag(enable == "1");
     }
   }
   for (std::size_t i = 0; i < kLegacyFilters.size(); ++i) {
@@ -118,34 +142,34 @@ void ReadFilterContainers(CHFMigrator& engine, wxXmlNode* root) {
   }
 }
 
-void ReadImposeSection(wxXmlNode* root, const wchar_t* name, SettingsMap& map) {
-  wxXmlNode* section = FindElement(root, name);
-  if (!section) return;
-  ReadSection(section, map);
-  for (const wxXmlNode* child = section->GetChildren(); child; child = child->GetNext()) {
-    if (child->GetType() != wxXML_ELEMENT_NODE) continue;
+void ReadImposeSection(const ConfigTree& tree, Id root, const wchar_t* name, SettingsMap& map) {
+  Id section = FindElement(tree, root, name);
+  if (section == kNone) return;
+  ReadSection(tree, section, map);
+  for (Id child = tree.FirstChild(section); child != kNone; child = tree.Next(child)) {
+    if (tree.GetType(child) != Type::kElement) continue;
     for (const wchar_t* part : kImposeParts) {
-      if (child->GetName() == part) ReadSection(child, map);
+      if (NameIs(tree.Name(child), part)) ReadSection(tree, child, map);
     }
   }
 }
 
-void ReadDocument(CHFMigrator& engine, wxXmlNode* root) {
+void ReadDocument(CHFMigrator& engine, const ConfigTree& tree, Id root) {
   for (const Section& section : kLeadingSections) {
-    ReadSection(FindElement(root, section.name), engine.*section.map);
+    ReadSection(tree, FindElement(tree, root, section.name), engine.*section.map);
   }
-  ReadFilterSections(engine, root);
-  ReadFilterContainers(engine, root);
+  ReadFilterSections(engine, tree, root);
+  ReadFilterContainers(engine, tree, root);
   for (const Section& section : kDriverSections) {
-    ReadSection(FindElement(root, section.name), engine.*section.map);
+    ReadSection(tree, FindElement(tree, root, section.name), engine.*section.map);
   }
   for (const Section& section : kImposeSections) {
-    ReadImposeSection(root, section.name, engine.*section.map);
+    ReadImposeSection(tree, root, section.name, engine.*section.map);
   }
 }
 
-bool MatchesElement(const wxXmlNode* node, const wxString& name) {
-  return node->GetType() == wxXML_ELEMENT_NODE && node->GetName() == name;
+bool MatchesElement(const ConfigTree& tree, Id node, const wchar_t* name) {
+  return tree.GetType(node) == Type::kElement && NameIs(tree.Name(node), name);
 }
 
 }  // namespace
@@ -153,29 +177,29 @@ bool MatchesElement(const wxXmlNode* node, const wxString& name) {
 // Depth-first with an explicit stack, so that no document can exhaust the
 // call stack. A node's direct children are all checked before any subtree is
 // entered, and subtrees are entered in document order.
-wxXmlNode* FindElement(wxXmlNode* start, const wxString& name) {
-  std::vector<wxXmlNode*> pending;
-  if (start) pending.push_back(start);
+Id FindElement(const ConfigTree& tree, Id start, const wchar_t* name) {
+  std::vector<Id> pending;
+  if (start != kNone) pending.push_back(start);
   while (!pending.empty()) {
-    wxXmlNode* node = pending.back();
+    Id node = pending.back();
     pending.pop_back();
     std::size_t first_subtree = pending.size();
-    for (wxXmlNode* child = node->GetChildren(); child; child = child->GetNext()) {
-      if (MatchesElement(child, name)) return child;
-      if (child->GetType() == wxXML_ELEMENT_NODE) pending.push_back(child);
+    for (Id child = tree.FirstChild(node); child != kNone; child = tree.Next(child)) {
+      if (MatchesElement(tree, child, name)) return child;
+      if (tree.GetType(child) == Type::kElement) pending.push_back(child);
     }
     // Pushed in document order; reversed so the first subtree is taken next.
     std::reverse(pending.begin() + first_subtree, pending.end());
   }
-  return nullptr;
+  return kNone;
 }
 
-void ReadSection(const wxXmlNode* section, SettingsMap& map) {
-  if (!section) return;
-  for (const wxXmlNode* child = section->GetChildren(); child; child = child->GetNext()) {
-    const wxXmlNode* first = NthChild(child, 0);
-    if (first && !first->GetContent().empty())
-      map.GetOrInsert(child->GetName()) = first->GetContent();
+void ReadSection(const ConfigTree& tree, Id section, SettingsMap& map) {
+  if (section == kNone) return;
+  for (Id child = tree.FirstChild(section); child != kNone; child = tree.Next(child)) {
+    Id first = NthChild(tree, child, 0);
+    if (first != kNone && !tree.Content(first).empty())
+      map.GetOrInsert(Wide(tree.Name(child))) = Wide(tree.Content(first));
   }
 }
 
@@ -187,8 +211,8 @@ bool ReadFolderConfiguration(CHFMigrator& engine, std::size_t index) {
 
   engine.ClearSettingsMaps();
   engine.m_FolderSettings.GetOrInsert(wxS("HFFolderPath")) = folder;
-  wxXmlDocument doc;
-  if (LoadFolderConfig(config, &doc)) ReadDocument(engine, doc.GetRoot());
+  ConfigTree tree;
+  if (LoadFolderConfig(config, &tree)) ReadDocument(engine, tree, tree.Root());
 
   bool listed_disabled =
       index < engine.m_EnabledFlags.size() && engine.m_EnabledFlags[index] == wxS("0");

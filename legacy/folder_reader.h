@@ -2,21 +2,20 @@
 #ifndef HF_LEGACY_FOLDER_READER_H_
 #define HF_LEGACY_FOLDER_READER_H_
 
-#include <wx/string.h>
-#include <wx/xml/xml.h>
-
 #include <cstddef>
 
 #include "engine/migrator.h"
+#include "legacy/config_tree.h"
 
-// The first element named `name` below `start` (never `start` itself): a
-// direct child of `start` wins; failing that, the first child subtree in
-// document order that holds a match, however deep. Null when none matches.
-wxXmlNode* FindElement(wxXmlNode* start, const wxString& name);
+// The first element named `name` (ASCII) below `start` (never `start`
+// itself): a direct child of `start` wins; failing that, the first child
+// subtree in document order that holds a match, however deep. kNone when
+// none matches or `start` is kNone.
+ConfigTree::Id FindElement(const ConfigTree& tree, ConfigTree::Id start, const wchar_t* name);
 
 // Sets map[child name] = text for every child of `section` whose first child
-// carries a non-empty text. A null section changes nothing.
-void ReadSection(const wxXmlNode* section, SettingsMap& map);
+// carries a non-empty text. A section of kNone changes nothing.
+void ReadSection(const ConfigTree& tree, ConfigTree::Id section, SettingsMap& map);
 
 // Reads folder `index` of the engine's folder list: empties every settings
 // map, sets "HFFolderPath", reads the sections of its folder.cfg and sets the

@@ -1,7 +1,6 @@
 #include "legacy/folder_reader.h"
 
 #include <gtest/gtest.h>
-#include <wx/sstream.h>
 
 #include <optional>
 #include <string>
@@ -43,11 +42,11 @@ TEST_F(FolderReaderTest, CasesFromData) {
   ASSERT_FALSE(cases.empty());
   for (const CaseRow& c : cases) {
     if (c.at(0) == "find") {
-      wxXmlDocument doc;
-      wxStringInputStream in(c.at(1));
-      ASSERT_TRUE(doc.Load(in)) << c[1];
-      wxXmlNode* found = FindElement(doc.GetRoot(), "x");
-      EXPECT_EQ(found ? found->GetAttribute("id") : "", c.at(2)) << c[1];
+      ConfigTree tree;
+      ASSERT_TRUE(tree.Parse(c.at(1))) << c[1];
+      ConfigTree::Id found = FindElement(tree, tree.Root(), L"x");
+      ConfigTree::Id text = found == ConfigTree::kNone ? found : tree.FirstChild(found);
+      EXPECT_EQ(text == ConfigTree::kNone ? "" : tree.Content(text), c.at(2)) << c[1];
       continue;
     }
     engine_.m_DriverSettings.GetOrInsert("left") = "over";

@@ -2,16 +2,14 @@
 
 #include <expat.h>
 #include <wx/log.h>
-#include <wx/mstream.h>
 
 #include <cstring>
-#include <vector>
 
 #include "platform/platform.h"
 
 namespace {
 
-// What wx would build from the document, measured as it streams past.
+// What the tree would hold, measured as the document streams past.
 // Content counts after entity expansion, so a small file that expands into
 // a huge tree is refused like a huge file.
 struct Measure {
@@ -41,9 +39,9 @@ void XMLCALL OnText(void* data, const XML_Char*, int length) {
   Charge(static_cast<Measure*>(data), static_cast<std::size_t>(length));
 }
 
-// wx reads a declared single-byte encoding that expat does not know through
-// a table of its own. Nesting depends only on the ASCII markup, so reading
-// such bytes as Latin-1 lets this check see the structure wx will see.
+// The tree reads a declared single-byte encoding that expat does not know
+// through wx's table of it. Nesting depends only on the ASCII markup, so reading
+// such bytes as Latin-1 lets this check see the structure the tree will have.
 int XMLCALL OnUnknownEncoding(void*, const XML_Char*, XML_Encoding* info) {
   for (int i = 0; i < 256; ++i) info->map[i] = i;
   info->data = nullptr;
@@ -77,48 +75,6 @@ bool PlainlyWithinBounds(const std::string& bytes) {
   return true;
 }
 
-bool IsBlank(const wxString& text) {
-  for (wxUniChar c : text) {
-    if (c != ' ' && c != '\t' && c != '\n' && c != '\r') return false;
-  }
-  return true;
-}
-
-// wx joins the pieces expat hands over for one text (split at line ends and
-// references) into one node, but its default mode drops each piece that is
-// blank on its own, so "\n  value" would read "  value". The document is
-// therefore loaded with every piece kept, and only the text nodes that are
-// blank as a whole are dropped here. The siblings are relinked in one pass:
-// unlinking each node by itself would walk its siblings every time.
-void DropBlankText(wxXmlNode* root) {
-  std::vector<wxXmlNode*> elements{root};
-  while (!elements.empty()) {
-    wxXmlNode* element = elements.back();
-    elements.pop_back();
-    wxXmlNode* kept = nullptr;
-    wxXmlNode* next = nullptr;
-    for (wxXmlNode* child = element->GetChildren(); child; child = next) {
-      next = child->GetNext();
-      if (child->GetType() == wxXML_TEXT_NODE && IsBlank(child->GetContent())) {
-        delete child;
-        continue;
-      }
-      if (kept) {
-        kept->SetNext(child);
-      } else {
-        element->SetChildren(child);
-      }
-      kept = child;
-      if (child->GetType() == wxXML_ELEMENT_NODE) elements.push_back(child);
-    }
-    if (kept) {
-      kept->SetNext(nullptr);
-    } else {
-      element->SetChildren(nullptr);
-    }
-  }
-}
-
 }  // namespace
 
 bool XmlWithinBounds(const std::string& bytes) {
@@ -134,7 +90,7 @@ bool XmlWithinBounds(const std::string& bytes) {
   return status == XML_STATUS_OK;
 }
 
-bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc) {
+bool LoadFolderConfig(const wxString& windows_path, ConfigTree* tree) {
   std::string bytes;
   // Read as any program opening it by name would: through a link.
   if (platform::ReadRegularFile(windows_path.ToStdWstring(), kMaxConfigBytes, &bytes,
@@ -142,10 +98,8 @@ bool LoadFolderConfig(const wxString& windows_path, wxXmlDocument* doc) {
     return false;
   }
   if (!PlainlyWithinBounds(bytes) && !XmlWithinBounds(bytes)) return false;
-  // The tool prints nothing; wx would log a parse failure of its own.
+  // The conversion behind a declared encoding may log; the tool prints
+  // nothing.
   wxLogNull quiet;
-  wxMemoryInputStream stream(bytes.data(), bytes.size());
-  if (!doc->Load(stream, "UTF-8", wxXMLDOC_KEEP_WHITESPACE_NODES) || !doc->GetRoot()) return false;
-  DropBlankText(doc->GetRoot());
-  return true;
+  return tree->Parse(bytes) && tree->Root() != ConfigTree::kNone;
 }

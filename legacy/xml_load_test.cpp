@@ -34,8 +34,8 @@ TEST(XmlLoad, BoundsHoldOnEveryPath) {
   TempPrefix prefix;
   for (const auto& [name, bytes, loads] : cases) {
     prefix.WriteFile(prefix.Drive('d') / "folder.cfg", bytes);
-    wxXmlDocument doc;
-    EXPECT_EQ(LoadFolderConfig("D:\\folder.cfg", &doc), loads) << name;
+    ConfigTree tree;
+    EXPECT_EQ(LoadFolderConfig("D:\\folder.cfg", &tree), loads) << name;
   }
 }
 
