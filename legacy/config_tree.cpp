@@ -161,8 +161,14 @@ struct ConfigTreeBuilder {
 };
 
 bool ConfigTree::Parse(const std::string& bytes) {
-  nodes_.assign(1, Node{Type::kDocument, kNone, kNone, kNone, {}, {}});
+  // Room for what a folder.cfg usually holds, so that the buffers seldom
+  // grow while expat hands over the pieces: its names and texts take
+  // fewer bytes than its markup, and a node stands for some 30 of them.
+  nodes_.clear();
+  nodes_.reserve(bytes.size() / 16 + 1);
+  nodes_.push_back(Node{Type::kDocument, kNone, kNone, kNone, {}, {}});
   text_.clear();
+  text_.reserve(bytes.size());
   XML_Parser parser = XML_ParserCreate(nullptr);
   if (!parser) return false;
   ConfigTreeBuilder builder{this, parser};

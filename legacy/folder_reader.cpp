@@ -3,8 +3,9 @@
 // enable text (inside the third child).
 #include "legacy/folder_reader.h"
 
-#include <algorithm>
 #include <cstdint>
+#include <cwchar>
+#include <iterator>
 #include <string_view>
 #include <vector>
 
@@ -46,22 +47,29 @@ constexpr Id kNone = ConfigTree::kNone;
 
 // The names looked for are ASCII, so comparing their characters with the
 // bytes of a UTF-8 name matches exactly the names that are equal as wide
-// strings, without converting any.
-bool NameIs(std::string_view utf8, const wchar_t* ascii) {
-  for (char c : utf8) {
-    if (*ascii == 0 || static_cast<wchar_t>(static_cast<unsigned char>(c)) != *ascii) return false;
-    ++ascii;
+// strings, without converting any. `ascii_size` is wcslen(ascii).
+bool NameIs(std::string_view utf8, const wchar_t* ascii, std::size_t ascii_size) {
+  if (utf8.size() != ascii_size) return false;
+  for (std::size_t i = 0; i < ascii_size; ++i) {
+    if (static_cast<wchar_t>(static_cast<unsigned char>(utf8[i])) != ascii[i]) return false;
   }
-  return *ascii == 0;
+  return true;
 }
 
 // Only what the maps keep, or what a number is read from, is made wide, as
 // wx made its strings from expat's UTF-8 (on Windows a character beyond
-// 16 bits becomes a surrogate pair). An empty slice is not converted: wx
-// would take the character after it for the start of a string that failed
-// to convert, and assert.
+// 16 bits becomes a surrogate pair). Most texts are short and ASCII, and
+// are widened byte for byte, which is what the conversion gives them. An
+// empty slice is not converted: wx would take the character after it for
+// the start of a string that failed to convert, and assert.
 wxString Wide(std::string_view utf8) {
-  return utf8.empty() ? wxString() : wxString::FromUTF8Unchecked(utf8.data(), utf8.size());
+  wchar_t ascii[128];
+  if (utf8.size() <= std::size(ascii)) {
+    std::size_t i = 0;
+    for (; i < utf8.size() && static_cast<unsigned char>(utf8[i]) < 0x80; ++i) ascii[i] = utf8[i];
+    if (i == utf8.size()) return wxString(ascii, i);
+  }
+  return wxString::FromUTF8Unchecked(utf8.data(), utf8.size());
 }
 
 // Comments and processing instructions do not count where a node is located
@@ -149,7 +157,7 @@ void ReadImposeSection(const ConfigTree& tree, Id root, const wchar_t* name, Set
   for (Id child = tree.FirstChild(section); child != kNone; child = tree.Next(child)) {
     if (tree.GetType(child) != Type::kElement) continue;
     for (const wchar_t* part : kImposeParts) {
-      if (NameIs(tree.Name(child), part)) ReadSection(tree, child, map);
+      if (NameIs(tree.Name(child), part, std::wcslen(part))) ReadSection(tree, child, map);
     }
   }
 }
@@ -168,30 +176,43 @@ void ReadDocument(CHFMigrator& engine, const ConfigTree& tree, Id root) {
   }
 }
 
-bool MatchesElement(const ConfigTree& tree, Id node, const wchar_t* name) {
-  return tree.GetType(node) == Type::kElement && NameIs(tree.Name(node), name);
+Id NextElement(const ConfigTree& tree, Id node) {
+  while (node != kNone && tree.GetType(node) != Type::kElement) node = tree.Next(node);
+  return node;
 }
 
 }  // namespace
 
-// Depth-first with an explicit stack, so that no document can exhaust the
-// call stack. A node's direct children are all checked before any subtree is
-// entered, and subtrees are entered in document order.
+// Depth-first, back up by the parent links: no stack of its own to fill,
+// and no call stack a document could exhaust. A node's direct children are
+// all checked before any subtree is entered, and subtrees are entered in
+// document order.
 Id FindElement(const ConfigTree& tree, Id start, const wchar_t* name) {
-  std::vector<Id> pending;
-  if (start != kNone) pending.push_back(start);
-  while (!pending.empty()) {
-    Id node = pending.back();
-    pending.pop_back();
-    std::size_t first_subtree = pending.size();
+  if (start == kNone) return kNone;
+  const std::size_t name_size = std::wcslen(name);
+  Id node = start;
+  for (;;) {
     for (Id child = tree.FirstChild(node); child != kNone; child = tree.Next(child)) {
-      if (MatchesElement(tree, child, name)) return child;
-      if (tree.GetType(child) == Type::kElement) pending.push_back(child);
+      if (tree.GetType(child) == Type::kElement && NameIs(tree.Name(child), name, name_size))
+        return child;
     }
-    // Pushed in document order; reversed so the first subtree is taken next.
-    std::reverse(pending.begin() + first_subtree, pending.end());
+    Id below = NextElement(tree, tree.FirstChild(node));
+    if (below != kNone) {
+      node = below;
+      continue;
+    }
+    // No match in this subtree: on to the next element after it, on the
+    // nearest level up that has one, until the search is back at `start`.
+    for (;;) {
+      if (node == start) return kNone;
+      Id next = NextElement(tree, tree.Next(node));
+      if (next != kNone) {
+        node = next;
+        break;
+      }
+      node = tree.Parent(node);
+    }
   }
-  return kNone;
 }
 
 void ReadSection(const ConfigTree& tree, Id section, SettingsMap& map) {
