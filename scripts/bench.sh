@@ -44,9 +44,11 @@ server_lock=/tmp/hfmigrate-hotfolder-tests.lock
 store_of() { echo "$1/drive_c/ProgramData/KYR/Dirorodiv/HotFolders.db"; }
 
 # Starts the server stand-in in prefix $1 and returns once it holds its
-# mutex (a lock file under the prefix that it keeps open).
+# mutex (a lock file under the prefix that it keeps open). The stand-in does
+# not inherit the test lock: one left behind by an interrupted run would
+# otherwise hold every test that starts a server.
 start_server() {
-  WINEPREFIX="$1" "$bin/hotfolder.exe" &
+  WINEPREFIX="$1" "$bin/hotfolder.exe" {lock}>&- &
   server=$!
   for _ in $(seq 100); do
     if ls -l "/proc/$server/fd" 2>/dev/null | grep -q "$1/.mutex/"; then return 0; fi
