@@ -23,8 +23,15 @@ bool Exec(sqlite3* db, const char* sql) {
 bool Statement::Prepare(sqlite3* db, const std::string& sql) {
   sqlite3_finalize(stmt_);
   stmt_ = nullptr;
-  return sqlite3_prepare_v3(db, sql.c_str(), static_cast<int>(sql.size()),
-                            SQLITE_PREPARE_PERSISTENT, &stmt_, nullptr) == SQLITE_OK;
+  // One buffer per parameter, made here once: a buffer must not move while
+  // SQLite holds its text (a short string's text lives inside it).
+  texts_.clear();
+  if (sqlite3_prepare_v3(db, sql.c_str(), static_cast<int>(sql.size()), SQLITE_PREPARE_PERSISTENT,
+                         &stmt_, nullptr) != SQLITE_OK) {
+    return false;
+  }
+  texts_.resize(static_cast<std::size_t>(sqlite3_bind_parameter_count(stmt_)) + 1);
+  return true;
 }
 
 namespace {
@@ -32,7 +39,8 @@ namespace {
 // The encoding wxString::utf8_str() gives, written out because its converter
 // and buffer cost more than the rest of a bind: code points past U+10FFFF
 // fail, and a UTF-16 surrogate is encoded as it stands, as wx does. Where
-// wchar_t is UTF-16 the conversion is left to wx.
+// wchar_t is UTF-16 the conversion is left to wx. The text is read in place
+// and written through a pointer, without a check for room at every byte.
 bool ToUtf8(const wxString& text, std::string* out) {
   out->clear();
   if (sizeof(wchar_t) != 4) {
@@ -41,22 +49,41 @@ bool ToUtf8(const wxString& text, std::string* out) {
     out->assign(utf8.data(), utf8.length());
     return true;
   }
-  for (wchar_t c : text.ToStdWstring()) {
-    std::uint32_t code = static_cast<std::uint32_t>(c);
+  // Room for the longest form, four bytes a character, cut to what was
+  // written.
+  out->resize(4 * text.length());
+  char* const start = &(*out)[0];
+  char* to = start;
+  for (const wchar_t *c = text.wc_str(), *end = c + text.length(); c != end; ++c) {
+    const std::uint32_t code = static_cast<std::uint32_t>(*c);
+    if (code < 0x80) {
+      *to++ = static_cast<char>(code);
+      continue;
+    }
     if (code > 0x10FFFF) return false;
-    AppendUtf8(code, out);
+    to = WriteUtf8(code, to);
   }
+  out->resize(static_cast<std::size_t>(to - start));
   return true;
 }
 
 }  // namespace
 
+// The text stays in this statement's buffer for its parameter until the
+// parameter is bound again or Reset clears every binding, so SQLite is
+// handed it without a copy of its own.
 bool Statement::BindText(int index, const wxString& text) {
+  if (index < 1 || static_cast<std::size_t>(index) >= texts_.size()) return false;
+  std::string& utf8 = texts_[index];
   // The explicit length keeps an embedded NUL character. A string with no
-  // UTF-8 form converts to nothing; storing that would lose the value.
-  if (!ToUtf8(text, &utf8_)) return false;
-  return sqlite3_bind_text64(stmt_, index, utf8_.data(), utf8_.size(), SQLITE_TRANSIENT,
-                             SQLITE_UTF8) == SQLITE_OK;
+  // UTF-8 form converts to nothing; storing that would lose the value. Its
+  // parameter is left bound to nothing rather than to the buffer's old text.
+  if (!ToUtf8(text, &utf8)) {
+    sqlite3_bind_null(stmt_, index);
+    return false;
+  }
+  return sqlite3_bind_text64(stmt_, index, utf8.data(), utf8.size(), SQLITE_STATIC, SQLITE_UTF8) ==
+         SQLITE_OK;
 }
 
 bool Statement::BindUtf8(int index, const std::string& utf8) {

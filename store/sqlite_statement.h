@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <vector>
 
 namespace db {
 
@@ -59,7 +60,9 @@ class Statement {
   sqlite3_stmt* stmt_ = nullptr;
   bool failed_ = false;
   bool bad_text_ = false;
-  std::string utf8_;  // kept between binds so that a bind allocates nothing
+  // The bound texts by parameter index, kept between binds so that a bind
+  // allocates nothing. SQLite reads them in place (see BindText).
+  std::vector<std::string> texts_;
 };
 
 }  // namespace db
