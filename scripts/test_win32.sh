@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Proves the Windows build under Wine, in one real prefix made for this run:
-#   - the platform contract tests (platform_test.exe);
+#   - the platform contract tests (platform_test.exe), and the filter tree's
+#     text against the XML library's, with UTF-16 text (filter_xml_test.exe);
 #   - the demo installation and a generated one of 300 folders, each
 #     migrated by hfmigrate.exe under Wine and by the Linux hfmigrate, each in
 #     its own copy of the prefix with the server stand-in at the same Windows
@@ -266,6 +267,7 @@ platform_contract() {
   HF_LINK_DIR='C:\hf-links' \
   HF_BIN_DIR="$(WINEPREFIX=$p winepath -w "$win_bin" 2>/dev/null)" WINEPREFIX=$p \
     timeout 300 wine build-win64/tests/platform_test.exe
+  WINEPREFIX=$p timeout 300 wine build-win64/tests/filter_xml_test.exe
 }
 
 # --- Start-up with a server running, over an empty installation -----------------
