@@ -3,6 +3,8 @@
 // looked at, since they need not be installed when the folders migrate.
 #include "convert/templates.h"
 
+#include <wx/wxcrt.h>
+
 #include <cstddef>
 
 #include "engine/migrator.h"
