@@ -4,8 +4,8 @@
 #include <iterator>
 #include <vector>
 
-#include "convert/ascii_text.h"
 #include "convert/server_lookup.h"
+#include "engine/ascii_text.h"
 #include "engine/legacy_filters.h"
 
 namespace {
@@ -92,39 +92,63 @@ const DefaultFilter kDefaultChain[] = {
     {&CHFMigrator::m_Vdp, nullptr, 0, "KYR.VDP.1", "VDP", false},
 };
 
-void Append(FilterChain* chain, wxXmlNode* root, const SettingsMap& settings,
-            const char* identifier, const char* display_name) {
-  wxString id = AsciiText(identifier);
-  root->AddChild(BuildFilterElement(settings, id));
-  chain->entries.push_back({AsciiText(display_name), id});
+// The texts of the chain's tables, made wide once per run: every folder
+// reads the filter-enable map for each legacy filter and appends several
+// filters.
+struct ChainFilter {
+  wxString identifier;
+  wxString display_name;
+};
+
+ChainFilter Wide(const char* identifier, const char* display_name) {
+  return {AsciiText(identifier), AsciiText(display_name)};
 }
 
-// The fixed values as wide texts, made once per run: every folder of the
-// default chain writes all of them.
 struct WideFixedValue {
-  wxString key;
+  SettingsKey key;
   wxString value;
   bool server_directory;
 };
 
-const std::vector<WideFixedValue>& WideFixedValues(std::size_t filter) {
-  static const std::vector<std::vector<WideFixedValue>> tables = [] {
-    std::vector<std::vector<WideFixedValue>> wide(std::size(kDefaultChain));
-    for (std::size_t f = 0; f < std::size(kDefaultChain); ++f) {
-      for (std::size_t i = 0; i < kDefaultChain[f].fixed_count; ++i) {
-        const FixedValue& fixed = kDefaultChain[f].fixed_values[i];
-        wide[f].push_back({AsciiText(fixed.key), fixed.value ? AsciiText(fixed.value) : wxString(),
-                           fixed.value == nullptr});
+struct WideTables {
+  wxString on = AsciiText("1");
+  wxString filter_setting = AsciiText("FilterSetting");
+  std::vector<SettingsKey> enable_keys;                   // by row of kLegacyFilters
+  std::vector<ChainFilter> legacy;                        // by row of kLegacyFilters
+  std::vector<ChainFilter> defaults;                      // by row of kDefaultChain
+  std::vector<std::vector<WideFixedValue>> fixed_values;  // by row of kDefaultChain
+
+  WideTables() {
+    for (const LegacyFilter& filter : kLegacyFilters) {
+      enable_keys.emplace_back(wxString(filter.key));
+      legacy.push_back(Wide(filter.identifier, filter.display_name));
+    }
+    for (const DefaultFilter& filter : kDefaultChain) {
+      defaults.push_back(Wide(filter.identifier, filter.display_name));
+      std::vector<WideFixedValue>& wide = fixed_values.emplace_back();
+      for (std::size_t i = 0; i < filter.fixed_count; ++i) {
+        const FixedValue& fixed = filter.fixed_values[i];
+        wide.push_back({SettingsKey(AsciiText(fixed.key)),
+                        fixed.value ? AsciiText(fixed.value) : wxString(), fixed.value == nullptr});
       }
     }
-    return wide;
-  }();
-  return tables[filter];
+  }
+};
+
+const WideTables& Tables() {
+  static const WideTables tables;
+  return tables;
+}
+
+void Append(FilterChain* chain, wxXmlNode* root, const SettingsMap& settings,
+            const ChainFilter& filter) {
+  root->AddChild(BuildFilterElement(settings, filter.identifier));
+  chain->entries.push_back({filter.display_name, filter.identifier});
 }
 
 void WriteFixedValues(CHFMigrator& engine, std::size_t filter) {
   SettingsMap& settings = engine.*kDefaultChain[filter].settings;
-  for (const WideFixedValue& fixed : WideFixedValues(filter)) {
+  for (const WideFixedValue& fixed : Tables().fixed_values[filter]) {
     settings.GetOrInsert(fixed.key) =
         fixed.server_directory ? CachedServerDirectory(engine.m_ServerDirectory) : fixed.value;
   }
@@ -133,31 +157,34 @@ void WriteFixedValues(CHFMigrator& engine, std::size_t filter) {
 }  // namespace
 
 wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& identifier) {
-  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, L"Filter");
-  filter->AddAttribute(L"name", identifier);
-  auto* ui = new wxXmlNode(wxXML_ELEMENT_NODE, L"UI");
-  // AddChild walks to the end each time; inserting after the last child
-  // keeps a large map linear.
-  wxXmlNode* last = nullptr;
-  for (const SettingsMap::Entry& entry : settings) {
-    auto* element = new wxXmlNode(wxXML_ELEMENT_NODE, entry.first);
-    element->AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(), entry.second));
-    ui->InsertChildAfter(element, last);
-    last = element;
+  static const wxString kFilter(L"Filter");
+  static const wxString kName(L"name");
+  static const wxString kUi(L"UI");
+  auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, kFilter);
+  filter->AddAttribute(kName, identifier);
+  auto* ui = new wxXmlNode(filter, wxXML_ELEMENT_NODE, kUi);
+  // A node made with its parent comes first among the parent's children, so
+  // the settings are made last to first; each is then linked in one step
+  // rather than after a walk to the end of the list.
+  for (auto entry = std::make_reverse_iterator(settings.end());
+       entry != std::make_reverse_iterator(settings.begin()); ++entry) {
+    auto* element = new wxXmlNode(ui, wxXML_ELEMENT_NODE, entry->first);
+    new wxXmlNode(element, wxXML_TEXT_NODE, wxEmptyString, entry->second);
   }
-  filter->AddChild(ui);
   return filter;
 }
 
 FilterChain BuildFilterChain(CHFMigrator& engine, wxXmlNode* root) {
+  const WideTables& tables = Tables();
   FilterChain chain;
   root->SetType(wxXML_ELEMENT_NODE);
-  root->SetName(L"FilterSetting");
+  root->SetName(tables.filter_setting);
   bool default_chain = true;
   bool default_tiff = true;
-  for (const LegacyFilter& filter : kLegacyFilters) {
-    if (engine.m_FilterEnable.GetOrInsert(filter.key) != wxS("1")) continue;
-    Append(&chain, root, engine.*filter.converted, filter.identifier, filter.display_name);
+  for (std::size_t i = 0; i < kLegacyFilters.size(); ++i) {
+    const LegacyFilter& filter = kLegacyFilters[i];
+    if (engine.m_FilterEnable.GetOrInsert(tables.enable_keys[i]) != tables.on) continue;
+    Append(&chain, root, engine.*filter.converted, tables.legacy[i]);
     if (filter.default_chain == DefaultChain::kReplaced) default_chain = false;
     if (filter.default_chain == DefaultChain::kKeptWithoutTiff) default_tiff = false;
   }
@@ -166,7 +193,7 @@ FilterChain BuildFilterChain(CHFMigrator& engine, wxXmlNode* root) {
     const DefaultFilter& filter = kDefaultChain[i];
     if (filter.skipped_with_legacy_tiff && !default_tiff) continue;
     WriteFixedValues(engine, i);
-    Append(&chain, root, engine.*filter.settings, filter.identifier, filter.display_name);
+    Append(&chain, root, engine.*filter.settings, tables.defaults[i]);
   }
   return chain;
 }

@@ -10,7 +10,7 @@
 #include <cstdint>
 #include <string>
 
-#include "convert/ascii_text.h"
+#include "engine/ascii_text.h"
 #include "engine/migrator.h"
 #include "engine/numbers.h"
 

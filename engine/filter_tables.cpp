@@ -1,6 +1,9 @@
 #include "engine/filter_tables.h"
 
 #include <cstddef>
+#include <utility>
+
+#include "engine/ascii_text.h"
 
 namespace {
 
@@ -172,20 +175,46 @@ const FixedSetting kDcsFixed[] = {
     {"COMBINEALLFILES", "0", kLiteral},
 };
 
-template <typename Row, std::size_t N>
-std::vector<Row> AsVector(const Row (&rows)[N]) {
-  return std::vector<Row>(rows, rows + N);
+template <typename Prepared, typename Row, std::size_t N>
+std::vector<Prepared> AsVector(const Row (&rows)[N]) {
+  return std::vector<Prepared>(rows, rows + N);
+}
+
+template <std::size_t R, std::size_t F>
+ConversionStep Step(const ConversionRow (&rows)[R], const FixedSetting (&fixed)[F]) {
+  return ConversionStep{AsVector<PreparedRow>(rows), AsVector<PreparedFixed>(fixed)};
+}
+
+template <std::size_t F>
+ConversionStep FixedOnlyStep(const FixedSetting (&fixed)[F]) {
+  return ConversionStep{{}, AsVector<PreparedFixed>(fixed)};
+}
+
+wxString Wide(const char* ascii) {
+  return ascii ? AsciiText(ascii) : wxString();
 }
 
 }  // namespace
 
+PreparedRow::PreparedRow(const ConversionRow& row)
+    : legacy_key(Wide(row.legacy_key)),
+      key(Wide(row.key)),
+      other_key(Wide(row.other_key)),
+      rule(row.rule),
+      on_value(Wide(row.on_value)) {}
+
+PreparedFixed::PreparedFixed(const FixedSetting& setting)
+    : key(Wide(setting.key)), value(Wide(setting.value)), source(setting.source) {}
+
 ConversionStep LayoutStep(LayoutColumn column) {
   ConversionStep step;
   for (const LayoutRow& row : kLayoutRows) {
-    if (row.in_step[column]) step.rows.push_back(row.row);
+    if (row.in_step[column]) step.rows.emplace_back(row.row);
   }
   for (const LayoutFixed& fixed : kLayoutFixed) {
-    if (fixed.value[column]) step.fixed.push_back({fixed.key, fixed.value[column], kLiteral});
+    if (fixed.value[column]) {
+      step.fixed.emplace_back(FixedSetting{fixed.key, fixed.value[column], kLiteral});
+    }
   }
   return step;
 }
@@ -203,41 +232,44 @@ const ConversionStep& TiffStep() {
   return step;
 }
 const ConversionStep& TiffItStep() {
-  static const ConversionStep step = ConversionStep{AsVector(kTiffItRows), AsVector(kTiffItFixed)};
+  static const ConversionStep step = Step(kTiffItRows, kTiffItFixed);
   return step;
 }
 const ConversionStep& OneBitTiffStep() {
-  static const ConversionStep step =
-      ConversionStep{AsVector(kOneBitTiffRows), AsVector(kOneBitTiffFixed)};
+  static const ConversionStep step = Step(kOneBitTiffRows, kOneBitTiffFixed);
   return step;
 }
 const ConversionStep& CtlwStep() {
-  static const ConversionStep step = ConversionStep{AsVector(kCtlwRows), AsVector(kCtlwFixed)};
+  static const ConversionStep step = Step(kCtlwRows, kCtlwFixed);
   return step;
 }
 const ConversionStep& ExportPsStep() {
-  static const ConversionStep step =
-      ConversionStep{AsVector(kExportPsRows), AsVector(kExportPsFixed)};
+  static const ConversionStep step = Step(kExportPsRows, kExportPsFixed);
   return step;
 }
 const ConversionStep& PexFilterStep() {
-  static const ConversionStep step =
-      ConversionStep{AsVector(kPexFilterRows), AsVector(kPexFilterFixed)};
+  static const ConversionStep step = Step(kPexFilterRows, kPexFilterFixed);
   return step;
 }
 
 const ConversionStep& MsOfficeStep() {
-  static const ConversionStep step = ConversionStep{{}, AsVector(kMsOfficeFixed)};
+  static const ConversionStep step = FixedOnlyStep(kMsOfficeFixed);
   return step;
 }
 const ConversionStep& DcsStep() {
-  static const ConversionStep step = ConversionStep{{}, AsVector(kDcsFixed)};
+  static const ConversionStep step = FixedOnlyStep(kDcsFixed);
   return step;
 }
 
-const char* ImagePositionText(const wxString& legacy) {
-  for (const PositionRow& row : kImagePositions) {
-    if (legacy == row.legacy) return row.text;
+const wxString* ImagePositionText(const wxString& legacy) {
+  static const std::vector<std::pair<wxString, wxString>> kWide = [] {
+    std::vector<std::pair<wxString, wxString>> wide;
+    for (const PositionRow& row : kImagePositions)
+      wide.emplace_back(Wide(row.legacy), Wide(row.text));
+    return wide;
+  }();
+  for (const auto& [digit, text] : kWide) {
+    if (legacy == digit) return &text;
   }
   return nullptr;
 }

@@ -9,6 +9,8 @@
 
 #include <vector>
 
+#include "engine/settings_map.h"
+
 enum class Rule {
   kCopy,                // the new key gets the legacy value unchanged
   kFlagPair,            // value == on_value: key "1", other_key "0"; else the
@@ -44,11 +46,30 @@ struct FixedSetting {
   FixedSource source;
 };
 
+// A row and a fixed setting as the conversion reads them: texts made wide
+// and keys hashed once per run, since every folder reads them all. An absent
+// text is empty.
+struct PreparedRow {
+  explicit PreparedRow(const ConversionRow& row);
+  SettingsKey legacy_key;
+  SettingsKey key;
+  SettingsKey other_key;
+  Rule rule;
+  wxString on_value;
+};
+
+struct PreparedFixed {
+  explicit PreparedFixed(const FixedSetting& setting);
+  SettingsKey key;
+  wxString value;
+  FixedSource source;
+};
+
 // One conversion step: its rows in matching order, and the settings written
 // after the converted entries, in order.
 struct ConversionStep {
-  std::vector<ConversionRow> rows;
-  std::vector<FixedSetting> fixed;
+  std::vector<PreparedRow> rows;
+  std::vector<PreparedFixed> fixed;
 };
 
 // The three filters of the layout family share one table, with a column per
@@ -71,6 +92,6 @@ const ConversionStep& DcsStep();
 
 // The text of a legacy "IMAGEPOSITION" digit; nullptr for a value that is
 // not a known position, which then writes nothing.
-const char* ImagePositionText(const wxString& legacy);
+const wxString* ImagePositionText(const wxString& legacy);
 
 #endif  // HF_ENGINE_FILTER_TABLES_H_

@@ -1,6 +1,6 @@
 // Table texts as wide strings.
-#ifndef HF_CONVERT_ASCII_TEXT_H_
-#define HF_CONVERT_ASCII_TEXT_H_
+#ifndef HF_ENGINE_ASCII_TEXT_H_
+#define HF_ENGINE_ASCII_TEXT_H_
 
 #include <wx/string.h>
 
@@ -24,4 +24,4 @@ inline wxString AsciiText(const char* ascii) {
   return wxString(wide, length);
 }
 
-#endif  // HF_CONVERT_ASCII_TEXT_H_
+#endif  // HF_ENGINE_ASCII_TEXT_H_
