@@ -160,6 +160,7 @@ wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& ident
   static const wxString kFilter(L"Filter");
   static const wxString kName(L"name");
   static const wxString kUi(L"UI");
+  static const wxString kNoName;
   auto* filter = new wxXmlNode(wxXML_ELEMENT_NODE, kFilter);
   filter->AddAttribute(kName, identifier);
   auto* ui = new wxXmlNode(filter, wxXML_ELEMENT_NODE, kUi);
@@ -169,7 +170,7 @@ wxXmlNode* BuildFilterElement(const SettingsMap& settings, const wxString& ident
   for (auto entry = std::make_reverse_iterator(settings.end());
        entry != std::make_reverse_iterator(settings.begin()); ++entry) {
     auto* element = new wxXmlNode(ui, wxXML_ELEMENT_NODE, entry->first);
-    new wxXmlNode(element, wxXML_TEXT_NODE, wxEmptyString, entry->second);
+    new wxXmlNode(element, wxXML_TEXT_NODE, kNoName, entry->second);
   }
   return filter;
 }

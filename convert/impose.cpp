@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include "engine/ascii_text.h"
 #include "engine/migrator.h"
@@ -88,15 +89,26 @@ const CodeTable kGangup = Table(kGangupRows, 0);
 
 int CodeOf(const CodeTable& table, const wxString& value) {
   for (std::size_t i = 0; i < table.count; ++i) {
-    if (value.CmpNoCase(AsciiText(table.rows[i].word)) == 0) return table.rows[i].code;
+    if (value.CmpNoCase(TableText(table.rows[i].word)) == 0) return table.rows[i].code;
   }
   return table.otherwise;
 }
 
 // The same digits as "%ld", without a format string to parse for each of
-// the dozens of numbers in a folder's imposition.
+// the dozens of numbers in a folder's imposition (std::to_wstring parses
+// one).
 wxString Decimal(long value) {
-  return wxString(std::to_wstring(value));
+  wchar_t digits[24];
+  wchar_t* const end = digits + sizeof(digits) / sizeof(digits[0]);
+  wchar_t* first = end;
+  unsigned long magnitude =
+      value < 0 ? 0UL - static_cast<unsigned long>(value) : static_cast<unsigned long>(value);
+  do {
+    *--first = static_cast<wchar_t>(L'0' + magnitude % 10);
+    magnitude /= 10;
+  } while (magnitude != 0);
+  if (value < 0) *--first = L'-';
+  return wxString(first, static_cast<std::size_t>(end - first));
 }
 
 // The store's fixed point: 16 fractional bits in a signed 32-bit integer,
@@ -121,26 +133,28 @@ class ImposeWriter {
         di_(engine.m_ImposeDeliveryInfo),
         out_(out) {}
 
-  // Keywords and keys are the table's ASCII texts (see AsciiText).
+  // Keywords and keys are the table's ASCII texts (see TableText).
   void Put(const char* keyword, const wxString& value) {
-    wxString key = AsciiText(keyword);
-    out_.insert({key, db::ImposeSettingEntry{key, value}});
+    const wxString& key = TableText(keyword);
+    auto [entry, added] = out_.try_emplace(key);
+    if (added) entry->second = db::ImposeSettingEntry{key, value};
   }
-  void Put(const char* keyword, const char* value) { Put(keyword, AsciiText(value)); }
+  void Put(const char* keyword, const char* value) { Put(keyword, TableText(value)); }
 
   // Writers for a key that is present, whatever its value.
   void Copy(const SettingsMap& from, const char* key, const char* keyword) {
-    if (const wxString* value = from.Find(AsciiText(key))) Put(keyword, *value);
+    if (const wxString* value = from.Find(TableKey(key))) Put(keyword, *value);
   }
   void Code(const SettingsMap& from, const char* key, const char* keyword, const CodeTable& table) {
-    if (const wxString* value = from.Find(AsciiText(key))) {
+    if (const wxString* value = from.Find(TableKey(key))) {
       Put(keyword, Decimal(CodeOf(table, *value)));
     }
   }
 
-  static wxString Text(const SettingsMap& from, const char* key) {
-    const wxString* value = from.Find(AsciiText(key));
-    return value ? *value : wxString();
+  static const wxString& Text(const SettingsMap& from, const char* key) {
+    static const wxString kAbsent;
+    const wxString* value = from.Find(TableKey(key));
+    return value ? *value : kAbsent;
   }
 
   void Marks();
@@ -169,20 +183,33 @@ void ImposeWriter::Marks() {
 // that is missing is left out without lowering the count, as the service
 // wrote it; the store reads what it was always sent.
 void ImposeWriter::LayoutAndGaps(bool zero_margins) {
-  wxString x = Text(ii_, "x");
-  wxString y = Text(ii_, "y");
+  const wxString& x = Text(ii_, "x");
+  const wxString& y = Text(ii_, "y");
   Put("QXImpLayout", x + L" " + y);
 
   std::int32_t columns = ReadInt32(x);
   std::int32_t rows = ReadInt32(y);
   if (columns > 10 || rows > 10) return;
 
-  const int count = zero_margins ? 10 : 5;
+  // The keys HorizontalGap0 to HorizontalGap9, then VerticalGap0 to
+  // VerticalGap9, made once per run.
+  constexpr int kMostGaps = 10;
+  static const std::vector<SettingsKey> kGapKeys = [] {
+    std::vector<SettingsKey> keys;
+    for (const char* direction : {"HorizontalGap", "VerticalGap"}) {
+      for (int i = 0; i < kMostGaps; ++i) keys.emplace_back(AsciiText(direction) + Decimal(i));
+    }
+    return keys;
+  }();
+  const int count = zero_margins ? kMostGaps : 5;
   wxString gaps;
-  for (const char* direction : {"HorizontalGap", "VerticalGap"}) {
+  for (int direction = 0; direction < 2; ++direction) {
     gaps += Decimal(count) + L" ";
     for (int i = 0; i < count; ++i) {
-      if (const wxString* gap = ii_.Find(AsciiText(direction) + Decimal(i))) gaps += *gap + L" ";
+      if (const wxString* gap = ii_.Find(kGapKeys[direction * kMostGaps + i])) {
+        gaps += *gap;
+        gaps += L' ';
+      }
     }
   }
   Put("QXImpFdGaps", gaps);
@@ -190,7 +217,7 @@ void ImposeWriter::LayoutAndGaps(bool zero_margins) {
 
 void ImposeWriter::ScaleBleedCreep() {
   Code(ii_, "AutoScale", "QXImpAutoPScal", kAutoScale);
-  if (const wxString* scale = ii_.Find(AsciiText("ScaleFactor"))) {
+  if (const wxString* scale = ii_.Find(TableKey("ScaleFactor"))) {
     Put("QXImpPageScale", *scale);
     Put("QXImpFdPgScale", FixedPoint(*scale));
   }
@@ -198,13 +225,13 @@ void ImposeWriter::ScaleBleedCreep() {
 
   // An absent vertical bleed leaves its half empty, not "0": the second
   // field is the legacy text, and there is none.
-  if (const wxString* horizontal = ii_.Find(AsciiText("HorizontalBleed"))) {
-    const wxString* vertical = ii_.Find(AsciiText("VerticalBleed"));
+  if (const wxString* horizontal = ii_.Find(TableKey("HorizontalBleed"))) {
+    const wxString* vertical = ii_.Find(TableKey("VerticalBleed"));
     Put("QXImpBleed",
         FixedPoint(*horizontal) + L" " + (vertical ? FixedPoint(*vertical) : wxString()));
     Put("QXImpFdBleed", *horizontal + L" " + (vertical ? *vertical : wxString()));
   }
-  if (const wxString* creep = ii_.Find(AsciiText("Creep"))) {
+  if (const wxString* creep = ii_.Find(TableKey("Creep"))) {
     wxString fixed = FixedPoint(*creep);
     Put("QXImpCreeps", fixed + L" " + fixed);
     Put("QXImpFdCreeps", *creep + L" " + *creep);
@@ -215,7 +242,7 @@ void ImposeWriter::ScaleBleedCreep() {
 // A legacy template decides alone, even one outside the table (its entry is
 // then empty); only a custom imposition file brings delivery settings.
 void ImposeWriter::TemplateAndDelivery(CHFMigrator& engine) {
-  wxString legacy_template = Text(ip_, "Template");
+  const wxString& legacy_template = Text(ip_, "Template");
   if (!legacy_template.empty()) {
     Put("QXImposeTemplate", engine.MapLegacyTemplate(legacy_template));
     return;

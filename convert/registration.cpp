@@ -4,6 +4,7 @@
 #include "convert/filter_chain.h"
 #include "convert/server_lookup.h"
 #include "convert/settings_dir.h"
+#include "engine/ascii_text.h"
 #include "engine/migrator.h"
 #include "store/store.h"
 
@@ -13,9 +14,13 @@ namespace {
 // through the translation lookup as the rest of the user-visible texts do.
 wxString QueueWord(const wxString& logical_printer) {
   wxString printer = logical_printer.Upper();
-  if (printer.Contains(wxGetTranslation("PRINT"))) return wxGetTranslation("print");
-  if (printer.Contains(wxGetTranslation("DIRECT"))) return wxGetTranslation("direct");
-  return wxGetTranslation("hold");
+  if (printer.Contains(wxGetTranslation(TableText("PRINT")))) {
+    return wxGetTranslation(TableText("print"));
+  }
+  if (printer.Contains(wxGetTranslation(TableText("DIRECT")))) {
+    return wxGetTranslation(TableText("direct"));
+  }
+  return wxGetTranslation(TableText("hold"));
 }
 
 // A migration can hold thousands of folders naming the same few servers;
@@ -33,8 +38,8 @@ bool ResolveCached(CHFMigrator& engine, const wxString& address, wxString* name)
 }
 
 void FillServer(CHFMigrator& engine, db::Setting* setting) {
-  setting->ServerAddr = engine.m_FolderSettings.GetOrInsert(L"ServerAddr");
-  setting->ServerName = engine.m_FolderSettings.GetOrInsert(L"ServerName");
+  setting->ServerAddr = engine.m_FolderSettings.GetOrInsert(TableKey("ServerAddr"));
+  setting->ServerName = engine.m_FolderSettings.GetOrInsert(TableKey("ServerName"));
   wxString resolved;
   if (!ResolveCached(engine, setting->ServerAddr, &resolved)) return;
   setting->ServerName = resolved;
@@ -46,7 +51,7 @@ db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterCha
   setting.Name = paths.name;
   setting.FolderPath = paths.full_path;
   setting.String1 = wxString();
-  setting.Queue = QueueWord(engine.m_FolderSettings.GetOrInsert(L"LogicalPrinter"));
+  setting.Queue = QueueWord(engine.m_FolderSettings.GetOrInsert(TableKey("LogicalPrinter")));
   setting.Queue2 = setting.Queue;
   FillServer(engine, &setting);
   setting.Flag1 = true;
@@ -63,8 +68,8 @@ db::Setting MakeSetting(CHFMigrator& engine, const FolderPaths& paths, FilterCha
 db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
   db::JobConfiguration job;
   for (const SettingsMap::Entry& entry : driver_settings) {
-    wxString key =
-        entry.first.IsSameAs(L"NumCopies", false) ? wxString(L"num copies") : entry.first;
+    const wxString& key =
+        entry.first.IsSameAs(TableText("NumCopies"), false) ? TableText("num copies") : entry.first;
     job.emplace(key, db::JobSettingEntry{entry.first, entry.second, wxString()});
   }
   return job;
@@ -78,10 +83,10 @@ bool CHFMigrator::RegisterHotFolder() {
   // store's own call.
   db::FilterConfiguration filter;
   FilterChain chain = BuildFilterChain(*this, &filter);
-  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert(L"HFFolderPath"));
+  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert(TableKey("HFFolderPath")));
   db::Setting setting = MakeSetting(*this, paths, chain);
   db::FolderConfiguration folder;
-  folder.FolderPath = m_FolderSettings.GetOrInsert(L"HFFolderPath");
+  folder.FolderPath = m_FolderSettings.GetOrInsert(TableKey("HFFolderPath"));
   folder.WorkFolder = paths.work;
   folder.FailedFolder = paths.failed;
   folder.MoveFolder = paths.move;

@@ -7,6 +7,7 @@
 
 #include <cstddef>
 
+#include "engine/ascii_text.h"
 #include "engine/migrator.h"
 #include "platform/platform.h"
 
@@ -74,7 +75,7 @@ bool HasWow6432ProductKey() {
 }
 
 wxString TemplateDirectory() {
-  return HasWow6432ProductKey() ? kTemplateDirX86 : kTemplateDir;
+  return TableText(HasWow6432ProductKey() ? kTemplateDirX86 : kTemplateDir);
 }
 
 wxString WindowsDirectoryPart(const wxString& path) {
@@ -95,9 +96,9 @@ wxString WindowsFileName(const wxString& path) {
 wxString CHFMigrator::MapLegacyTemplate(const wxString& identifier) {
   wxString directory = TemplateDirectory();
   for (const LegacyTemplate& row : kLegacyTemplates) {
-    if (identifier.find(row.form) != wxString::npos ||
-        identifier.find(row.lower_form) != wxString::npos) {
-      return directory + kSeparator + row.file;
+    if (identifier.find(TableText(row.form)) != wxString::npos ||
+        identifier.find(TableText(row.lower_form)) != wxString::npos) {
+      return directory + TableText(kSeparator) + TableText(row.file);
     }
   }
   return wxString();
@@ -109,8 +110,9 @@ wxString CHFMigrator::MapLegacyTemplate(const wxString& identifier) {
 // work folder to the folder's settings.
 wxString CHFMigrator::MakeCustomTemplatePath() {
   wxString directory = TemplateDirectory();
-  const wxString* work = m_FolderSettings.Find("WorkFolder");
+  const wxString* work = m_FolderSettings.Find(TableKey("WorkFolder"));
   wxString d1 = WindowsDirectoryPart(work ? *work : wxString());
   wxString d2 = WindowsDirectoryPart(d1);
-  return directory + kSeparator + "customTemplateHF2.x-" + WindowsFileName(d2) + ".dbt";
+  return directory + TableText(kSeparator) + TableText("customTemplateHF2.x-") +
+         WindowsFileName(d2) + TableText(".dbt");
 }
