@@ -3,6 +3,8 @@
 #include <wx/filename.h>
 
 #include <chrono>
+#include <cstddef>
+#include <string>
 #include <thread>
 
 #include "platform/platform.h"
@@ -63,13 +65,52 @@ bool Move(const wxString& from, const wxString& to, BusyRetries* retries) {
   }
 }
 
+// A plain drive path: a drive letter, a colon, then components each after
+// one backslash, none empty, none "." or "..", and no slash or colon in
+// them. wxFileName gives such a path back as it stands, and its name is the
+// last component up to that component's last dot (empty when the dot comes
+// first); that is worked out here directly, since nearly every listed folder
+// has such a path and wxFileName costs more than the rest of the folder's
+// paths. settings_dir_test holds the two side by side. False, with nothing
+// set, for any other path.
+bool SplitPlainDrivePath(const wxString& path, wxString* name) {
+  const wchar_t* const text = path.wc_str();
+  const std::size_t length = path.length();
+  const auto ascii_letter = [](wchar_t c) { return (c | 0x20) >= L'a' && (c | 0x20) <= L'z'; };
+  if (length < 4 || !ascii_letter(text[0]) || text[1] != L':' || text[2] != L'\\') return false;
+  std::size_t start = 3;  // of the component being read
+  std::size_t last_dot = std::wstring::npos;
+  for (std::size_t i = start;; ++i) {
+    if (i < length && text[i] != L'\\') {
+      if (text[i] == L'/' || text[i] == L':') return false;
+      if (text[i] == L'.') last_dot = i;
+      continue;
+    }
+    const std::size_t size = i - start;
+    if (size == 0 ||
+        (text[start] == L'.' && (size == 1 || (size == 2 && text[start + 1] == L'.')))) {
+      return false;
+    }
+    if (i == length) break;
+    start = i + 1;
+    last_dot = std::wstring::npos;
+  }
+  const std::size_t end = last_dot == std::wstring::npos ? length : last_dot;
+  name->assign(text + start, end - start);
+  return true;
+}
+
 }  // namespace
 
 FolderPaths MakeFolderPaths(const wxString& folder_path) {
-  wxFileName file_name(folder_path, wxPATH_WIN);
   FolderPaths paths;
-  paths.full_path = file_name.GetFullPath(wxPATH_WIN);
-  paths.name = file_name.GetName();
+  if (SplitPlainDrivePath(folder_path, &paths.name)) {
+    paths.full_path = folder_path;
+  } else {
+    wxFileName file_name(folder_path, wxPATH_WIN);
+    paths.full_path = file_name.GetFullPath(wxPATH_WIN);
+    paths.name = file_name.GetName();
+  }
   paths.settings = paths.full_path + kSeparator + kSettingsDirName;
   paths.work = paths.settings + kSeparator + L"[WorkFolder]";
   paths.failed = paths.settings + kSeparator + L"[FailedFolder]";
