@@ -1,4 +1,6 @@
 // Assembly of the store records of one hot folder and its registration.
+#include "convert/registration.h"
+
 #include <wx/intl.h>
 
 #include "convert/filter_chain.h"
@@ -77,33 +79,39 @@ db::JobConfiguration MakeJobConfiguration(const SettingsMap& driver_settings) {
 
 }  // namespace
 
-bool CHFMigrator::RegisterHotFolder() {
+void BuildFolderRecords(CHFMigrator& engine, FolderRecords* records) {
   // Every record is complete before the settings directory moves, so the
   // time in which the folder is neither legacy nor registered is only the
   // store's own call.
-  db::FilterConfiguration filter;
-  FilterChain chain = BuildFilterChain(*this, &filter);
-  FolderPaths paths = MakeFolderPaths(m_FolderSettings.GetOrInsert(TableKey("HFFolderPath")));
-  db::Setting setting = MakeSetting(*this, paths, chain);
-  db::FolderConfiguration folder;
-  folder.FolderPath = m_FolderSettings.GetOrInsert(TableKey("HFFolderPath"));
-  folder.WorkFolder = paths.work;
-  folder.FailedFolder = paths.failed;
-  folder.MoveFolder = paths.move;
-  db::JobConfiguration job = MakeJobConfiguration(m_DriverSettings);
-  db::ImposeConfiguration impose;
-  if (!m_ImpositionProperties.Empty()) ConvertImposeSettings(impose);
-  db::PreflightConfiguration preflight;
+  FilterChain chain = BuildFilterChain(engine, &records->filter);
+  // A copy: the lookups below may add keys to the map, moving its texts.
+  const wxString folder_path = engine.m_FolderSettings.GetOrInsert(TableKey("HFFolderPath"));
+  records->paths = MakeFolderPaths(folder_path);
+  records->enabled = engine.m_CurrentEnabled;
+  records->setting = MakeSetting(engine, records->paths, chain);
+  records->folder.FolderPath = folder_path;
+  records->folder.WorkFolder = records->paths.work;
+  records->folder.FailedFolder = records->paths.failed;
+  records->folder.MoveFolder = records->paths.move;
+  records->job = MakeJobConfiguration(engine.m_DriverSettings);
+  if (!engine.m_ImpositionProperties.Empty()) engine.ConvertImposeSettings(records->impose);
+}
 
+bool HandOverFolder(CHFMigrator& engine, FolderRecords& records,
+                    const std::function<void()>& after_move, bool* moved_back) {
+  *moved_back = false;
+  db::Setting& setting = records.setting;
   // Asked for before the move: it opens the store then, so that after the
   // move only the store's own transaction remains.
   RODuriZudaze& store = RODuriZudaze::GetInstance();
   // A folder listed disabled is stored disabled by the creation itself, so
   // that neither the running server nor a crash ever finds it enabled; the
   // DisableHotFolder below then finds it so.
-  if (!m_CurrentEnabled) store.CreateNextDisabled(setting.FolderPath);
-  Retirement retirement = RetireSettingsDirectory(paths);
-  bool registered = store.CreateHotFolder(setting, folder, job, filter, impose, preflight) != 0;
+  if (!records.enabled) store.CreateNextDisabled(setting.FolderPath);
+  Retirement retirement = RetireSettingsDirectory(records.paths);
+  if (after_move) after_move();
+  bool registered = store.CreateHotFolder(setting, records.folder, records.job, records.filter,
+                                          records.impose, records.preflight) != 0;
   // A folder refused because its path is registered already is in the
   // store (an earlier run registered it while its move failed or was lost
   // in a power cut): its settings stay retired. Any other refusal created
@@ -111,11 +119,19 @@ bool CHFMigrator::RegisterHotFolder() {
   // That move back may fail, and it is not synced: the run keeps its record
   // either way, so that the next run puts them back if they lie retired.
   if (!registered && !store.RefusedAsRegistered() && retirement.moved) {
-    RestoreSettingsDirectory(paths, retirement);
-    m_RunUndecided = true;
+    RestoreSettingsDirectory(records.paths, retirement);
+    engine.m_RunUndecided = true;
+    *moved_back = true;
   }
-  if (registered && !m_CurrentEnabled) {
+  if (registered && !records.enabled) {
     registered = RODuriZudaze::GetInstance().DisableHotFolder(setting.FolderPath);
   }
   return registered;
+}
+
+bool CHFMigrator::RegisterHotFolder() {
+  FolderRecords records;
+  BuildFolderRecords(*this, &records);
+  bool moved_back = false;
+  return HandOverFolder(*this, records, nullptr, &moved_back);
 }

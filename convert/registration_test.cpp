@@ -139,4 +139,20 @@ TEST(Registration, RetiringAndRefusal) {
   UseHostResolver(nullptr);
 }
 
+// A folder the store refuses gets its settings back; listed again under
+// another spelling, it is read again after the move back, not before it,
+// though the run reads each next folder while the store commits.
+TEST(Registration, RefusedFolderListedAgainIsReadAfterTheMoveBack) {
+  TempPrefix prefix;
+  const fs::path settings = prefix.Drive('d') / "Jobs" / "A" / "[_KYR_HotFolder_]";
+  prefix.WriteFile(settings / "folder.cfg", "<HotFolderConfiguration/>");
+  prefix.WriteFile(fs::path(StoreHostPath()), std::string(4096, 'x'));
+  CHFMigrator engine;
+  engine.m_Folders.Add("D:\\Jobs\\A");
+  engine.m_Folders.Add("d:\\jobs\\a\\");
+  engine.MigrateFolders();
+  EXPECT_EQ(wxJoin(engine.m_Status, '|').ToStdString(), "Unknown error|Unknown error");
+  EXPECT_TRUE(fs::exists(settings / "folder.cfg"));
+}
+
 }  // namespace
