@@ -40,19 +40,20 @@ namespace {
 // and buffer cost more than the rest of a bind: code points past U+10FFFF
 // fail, and a UTF-16 surrogate is encoded as it stands, as wx does. Where
 // wchar_t is UTF-16 the conversion is left to wx. The text is read in place
-// and written through a pointer, without a check for room at every byte.
-bool ToUtf8(const wxString& text, std::string* out) {
-  out->clear();
+// and written through a pointer into `buffer`, which only ever grows, so a
+// bind neither checks for room at every byte nor clears the buffer first;
+// `length` is what was written.
+bool ToUtf8(const wxString& text, std::string* buffer, std::size_t* length) {
   if (sizeof(wchar_t) != 4) {
     wxScopedCharBuffer utf8 = text.utf8_str();
     if (utf8.length() == 0 && !text.empty()) return false;
-    out->assign(utf8.data(), utf8.length());
+    buffer->assign(utf8.data(), utf8.length());
+    *length = buffer->size();
     return true;
   }
-  // Room for the longest form, four bytes a character, cut to what was
-  // written.
-  out->resize(4 * text.length());
-  char* const start = &(*out)[0];
+  // Room for the longest form, four bytes a character.
+  if (buffer->size() < 4 * text.length()) buffer->resize(4 * text.length());
+  char* const start = &(*buffer)[0];
   char* to = start;
   for (const wchar_t *c = text.wc_str(), *end = c + text.length(); c != end; ++c) {
     const std::uint32_t code = static_cast<std::uint32_t>(*c);
@@ -63,7 +64,7 @@ bool ToUtf8(const wxString& text, std::string* out) {
     if (code > 0x10FFFF) return false;
     to = WriteUtf8(code, to);
   }
-  out->resize(static_cast<std::size_t>(to - start));
+  *length = static_cast<std::size_t>(to - start);
   return true;
 }
 
@@ -74,15 +75,16 @@ bool ToUtf8(const wxString& text, std::string* out) {
 // handed it without a copy of its own.
 bool Statement::BindText(int index, const wxString& text) {
   if (index < 1 || static_cast<std::size_t>(index) >= texts_.size()) return false;
-  std::string& utf8 = texts_[index];
+  std::string& buffer = texts_[index];
+  std::size_t length = 0;
   // The explicit length keeps an embedded NUL character. A string with no
   // UTF-8 form converts to nothing; storing that would lose the value. Its
   // parameter is left bound to nothing rather than to the buffer's old text.
-  if (!ToUtf8(text, &utf8)) {
+  if (!ToUtf8(text, &buffer, &length)) {
     sqlite3_bind_null(stmt_, index);
     return false;
   }
-  return sqlite3_bind_text64(stmt_, index, utf8.data(), utf8.size(), SQLITE_STATIC, SQLITE_UTF8) ==
+  return sqlite3_bind_text64(stmt_, index, buffer.data(), length, SQLITE_STATIC, SQLITE_UTF8) ==
          SQLITE_OK;
 }
 
