@@ -52,6 +52,9 @@ void CHFMigrator::BeginRun() {
   }
   // What the interrupted run left and this run could not finish.
   m_RunUndecided = !entries.empty();
+  // Room for every folder at once: the record is the run's largest piece of
+  // memory, and growing it step by step would hold two copies of it.
+  entries.reserve(entries.size() + m_Folders.size());
   // The folders this run will retire: those the folder reader will find.
   // One that has a retired directory already keeps it, as the move fails.
   for (const wxString& folder : m_Folders) {

@@ -71,20 +71,23 @@ std::wstring RunRecordPath() {
   return StoreFolder() + kFileName;
 }
 
+// Built in one string, the count put in front at the end: a record of
+// thousands of folders is never held twice.
 std::string EncodeRunRecord(const std::vector<RunRecordEntry>& entries) {
-  std::string body;
+  std::string bytes;
   std::size_t count = 0;
   for (const RunRecordEntry& entry : entries) {
     wxScopedCharBuffer utf8 = entry.folder.utf8_str();
     if (utf8.length() == 0 && !entry.folder.empty()) continue;  // no UTF-8 form
-    body += entry.retires ? "R " : "K ";
-    body += std::to_string(utf8.length()) + ' ';
-    body.append(utf8.data(), utf8.length());
-    body += '\n';
+    bytes += entry.retires ? "R " : "K ";
+    bytes += std::to_string(utf8.length()) + ' ';
+    bytes.append(utf8.data(), utf8.length());
+    bytes += '\n';
     ++count;
   }
-  std::string bytes = kHeader + std::to_string(count) + '\n' + body;
-  return bytes + ChecksumLine(bytes);
+  bytes.insert(0, kHeader + std::to_string(count) + '\n');
+  bytes += ChecksumLine(bytes);
+  return bytes;
 }
 
 bool DecodeRunRecord(const std::string& bytes, std::vector<RunRecordEntry>* entries) {
