@@ -55,6 +55,8 @@ void CHFMigrator::MigrateFolders() {
   m_Status.Alloc(m_Status.size() + m_Folders.size());
   if (m_Folders.empty()) return;
   Worker worker;
+  // The records of a folder done with, freed by the worker, which made them.
+  std::unique_ptr<FolderRecords> spent;
   PreparedFolder next = PrepareFolder(*this, 0);
   for (std::size_t i = 0; i < m_Folders.size(); ++i) {
     PreparedFolder current = std::move(next);
@@ -65,7 +67,10 @@ void CHFMigrator::MigrateFolders() {
     if (current.records) {
       auto read_next = [&] {
         if (last) return;
-        worker.Start([&] { next = PrepareFolder(*this, i + 1); });
+        worker.Start([&] {
+          spent.reset();
+          next = PrepareFolder(*this, i + 1);
+        });
         read_ahead = true;
       };
       bool registered = false;
@@ -77,6 +82,7 @@ void CHFMigrator::MigrateFolders() {
       }
       if (read_ahead) worker.Wait();
       current.outcome = registered ? "Success" : "Unknown error";
+      spent = std::move(current.records);
     }
     m_Status.Add(current.outcome);
     if (!last && (!read_ahead || moved_back)) next = PrepareFolder(*this, i + 1);
