@@ -28,13 +28,13 @@ struct EscapeTable {
   const char* text[128] = {};
   const char* attribute[128] = {};
   constexpr EscapeTable() {
-    text['<'] = attribute['<'] = "&lt;";
-    text['>'] = attribute['>'] = "&gt;";
-    text['&'] = attribute['&'] = "&amp;";
-    text['\r'] = attribute['\r'] = "&#xD;";
-    attribute['"'] = "&quot;";
-    attribute['\t'] = "&#x9;";
-    attribute['\n'] = "&#xA;";
+    text[L'<'] = attribute[L'<'] = "&lt;";
+    text[L'>'] = attribute[L'>'] = "&gt;";
+    text[L'&'] = attribute[L'&'] = "&amp;";
+    text[L'\r'] = attribute[L'\r'] = "&#xD;";
+    attribute[L'"'] = "&quot;";
+    attribute[L'\t'] = "&#x9;";
+    attribute[L'\n'] = "&#xA;";
   }
   const char* const* Of(Escape escape) const {
     return escape == Escape::kText ? text : escape == Escape::kAttribute ? attribute : none;
