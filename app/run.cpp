@@ -24,7 +24,9 @@ struct PreparedFolder {
   std::unique_ptr<FolderRecords> records;
 };
 
-// Touches no file but the folder's folder.cfg and nothing of the store.
+// Writes nothing and asks nothing of the store: it reads the folder's
+// folder.cfg (and what conversion looks up: the registry's templates, the
+// server's name and directory) and builds the records in memory.
 PreparedFolder PrepareFolder(CHFMigrator& engine, std::size_t index) {
   PreparedFolder prepared;
   if (engine.m_UndecodedPaths.count(index) != 0) {
