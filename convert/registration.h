@@ -14,15 +14,9 @@
 
 // Everything the hand-over needs, so that it reads nothing of the engine's
 // maps.
-struct FolderRecords {
+struct FolderRecords : db::HotFolderRecordSet {
   FolderPaths paths;
   bool enabled = true;
-  db::Setting setting;
-  db::FolderConfiguration folder;
-  db::JobConfiguration job;
-  db::FilterConfiguration filter;
-  db::ImposeConfiguration impose;
-  db::PreflightConfiguration preflight;
 };
 
 // Reads the engine's maps of the folder just read and converted.

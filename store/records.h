@@ -91,6 +91,16 @@ class FilterConfiguration : public wxXmlNode {
 
 using PreflightConfiguration = std::vector<PreflightEntry>;
 
+// The six records of one hot folder, as CreateHotFolder takes them.
+struct HotFolderRecordSet {
+  Setting setting;
+  FolderConfiguration folder;
+  JobConfiguration job;
+  FilterConfiguration filter;
+  ImposeConfiguration impose;
+  PreflightConfiguration preflight;
+};
+
 }  // namespace db
 
 #endif  // HF_STORE_RECORDS_H_

@@ -9,14 +9,7 @@
 #include "store/store.h"
 #include "tests/run_program.h"
 
-struct Folder {
-  db::Setting setting;
-  db::FolderConfiguration folder;
-  db::JobConfiguration job;
-  db::FilterConfiguration filter;
-  db::ImposeConfiguration impose;
-  db::PreflightConfiguration preflight;
-
+struct Folder : db::HotFolderRecordSet {
   explicit Folder(const wxString& path) { setting.FolderPath = folder.FolderPath = path; }
   long Create() {
     return RODuriZudaze::GetInstance().CreateHotFolder(setting, folder, job, filter, impose,
